@@ -1,0 +1,55 @@
+#include "content.h"
+
+Content::Content(ContentData *data)
+    : m_data(data)
+{
+    if (m_data)
+        m_data->ref.ref();
+}
+
+Content::Content(const Content &other)
+    : m_data(other.m_data)
+{
+    if (m_data)
+        m_data->ref.ref();
+}
+
+Content::~Content()
+{
+    if (m_data && !m_data->ref.deref())
+        delete m_data;
+}
+
+Content &Content::operator=(const Content &other)
+{
+    if (m_data == other.m_data)
+        return *this;
+    // Take the new reference first: the old record may be what keeps `other` alive.
+    ContentData *data = other.m_data;
+    if (data)
+        data->ref.ref();
+    ContentData *old = m_data;
+    m_data = data;
+    if (old && !old->ref.deref())
+        delete old;
+    return *this;
+}
+
+ThemeletContent::Type Content::type() const
+{
+    return m_data ? ThemeletContent::Type(m_data->type) : ThemeletContent::Type(-1);
+}
+
+bool operator==(const Content &a, const Content &b)
+{
+    const ContentData *x = a.data();
+    const ContentData *y = b.data();
+    if (!x || !y)
+        return !x && !y;
+    return x->type == y->type && x->id == y->id;
+}
+
+bool operator!=(const Content &a, const Content &b)
+{
+    return !(a == b);
+}

@@ -1,0 +1,31 @@
+#ifndef PHOTODATA_H
+#define PHOTODATA_H
+
+#include "filedata.h"
+
+#include <QDateTime>
+
+class PhotoData : public FileData
+{
+public:
+    enum Role {
+        DateTakenRole = 8,
+        WidthRole,
+        HeightRole,
+        OrientationRole
+    };
+
+    PhotoData(qint64 id, const QUrl &url);
+
+    ContentData *clone() const override;
+    QVariant data(int role) const override;
+
+    static QHash<int, QByteArray> roleNames();
+
+    QDateTime dateTaken;
+    int width = 0;
+    int height = 0;
+    int orientation = 0;
+};
+
+#endif

@@ -1,0 +1,23 @@
+#include "queryagentdatabase.h"
+
+#include "queryagent.h"
+
+#include <QAtomicInt>
+
+namespace {
+QAtomicInt s_nextThreadId(0);
+}
+
+QueryAgentDatabase::QueryAgentDatabase()
+    : QSqlDatabase(QStringLiteral("QSQLITE"))
+    , m_queryCache(20)
+    , m_threadId(s_nextThreadId.fetchAndAddOrdered(1))
+{
+}
+
+QueryAgentDatabase::~QueryAgentDatabase()
+{
+    qDeleteAll(m_agents);
+    m_agents.clear();
+    m_queryCache.clear();
+}

@@ -1,0 +1,16 @@
+#ifndef QUERYAGENTSPECIALIZATION_H
+#define QUERYAGENTSPECIALIZATION_H
+
+#include "queryagent.h"
+
+// Gives an agent the role table of the record type it produces.
+template <typename T>
+class QueryAgentSpecialization : public QueryAgent
+{
+public:
+    explicit QueryAgentSpecialization(QueryAgentDatabase &database) : QueryAgent(database) {}
+
+    QHash<int, QByteArray> roleNames() const override { return T::roleNames(); }
+};
+
+#endif

@@ -1,0 +1,50 @@
+#include "contentmanager.h"
+
+#include "dbmanager.h"
+
+ContentManager::ContentManager() = default;
+
+ContentManager::~ContentManager() = default;
+
+QString ContentManager::mimeType() const
+{
+    return QString();
+}
+
+bool ContentManager::updateMetaData()
+{
+    return false;
+}
+
+bool ContentManager::save(qint64, const QMap<QString, QVariant> &)
+{
+    return false;
+}
+
+bool ContentManager::remove(qint64)
+{
+    return false;
+}
+
+ContentManager *ContentManager::managerFromType(int type)
+{
+    DbManager &database = DbManager::instance();
+    // The null entry stays, also for types that never get a manager.
+    ContentManager *&manager = database.m_contentManagers[ThemeletContent::Type(type)];
+    if (manager)
+        return manager;
+    if (uint(type) > 7 || type == 3 || type == 5)
+        return nullptr;
+
+    switch (type) {
+    default:
+        // Managers of the remaining types are added with their subsystems.
+        break;
+    }
+    return manager;
+}
+
+QList<ContentManager *> ContentManager::scannerManagers()
+{
+    return { managerFromType(ThemeletContent::Photo) };
+}
