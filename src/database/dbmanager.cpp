@@ -181,13 +181,17 @@ bool DbManager::updateSchema(const char *function, const char *message, const QS
     qDebug() << function << message;
     {
         QSqlQuery query(*this);
-        if (!query.exec(statement)) {
+        const bool ok = query.exec(statement);
+        if (!ok) {
             qWarning("%s", function);
             qWarning("Initialization failed");
             qWarning() << statement;
             qWarning() << query.lastError();
         }
         query.finish();
+        // The ladder goes on regardless; this step just leaves its version unwritten.
+        if (!ok)
+            return false;
     }
     if (!resetThemeletsForReparsing())
         return false;
