@@ -1,4 +1,5 @@
 #include "dbmanager.h"
+#include "messagelog.h"
 #include "testdatabase.h"
 
 #include <QtTest>
@@ -42,37 +43,6 @@ QStringList nuke(const QString &path)
              warning(QStringLiteral("Delete:  \"%1\"").arg(path)) };
 }
 
-// Collects every record while alive and, unless told to swallow them, passes
-// them on, so that ignoreMessage still applies.
-class LogCapture
-{
-public:
-    explicit LogCapture(bool forward = true)
-    {
-        s_records.clear();
-        s_forward = forward;
-        s_previous = qInstallMessageHandler(handler);
-    }
-    ~LogCapture() { qInstallMessageHandler(s_previous); }
-    QStringList records() const { return s_records; }
-
-private:
-    static void handler(QtMsgType type, const QMessageLogContext &context, const QString &text)
-    {
-        static const char *const levels[] = { "debug", "warning", "critical", "fatal", "info" };
-        s_records.append(QLatin1String(levels[type]) + QLatin1String(": ") + text);
-        if (s_forward)
-            s_previous(type, context, text);
-    }
-
-    static QStringList s_records;
-    static QtMessageHandler s_previous;
-    static bool s_forward;
-};
-
-QStringList LogCapture::s_records;
-QtMessageHandler LogCapture::s_previous = nullptr;
-bool LogCapture::s_forward = true;
 
 void ignore(const QStringList &records)
 {
@@ -185,7 +155,7 @@ private:
 QStringList tst_DbManager::startUp(const QStringList &expected, bool *open, bool quiet)
 {
     ignore(expected);
-    LogCapture capture(!quiet);
+    MessageLog capture(!quiet);
     DbManager manager;
     if (open)
         *open = manager.isOpen();

@@ -1,0 +1,67 @@
+#ifndef MESSAGELOG_H
+#define MESSAGELOG_H
+
+#include <QMutex>
+#include <QStringList>
+#include <QtGlobal>
+
+// Collects the records written while it lives, from any thread, in order.
+// QTest::ignoreMessage can't tell the order of records; this can. Records are
+// passed on unless told otherwise, so ignoreMessage still applies.
+class MessageLog
+{
+public:
+    explicit MessageLog(bool forward = true)
+    {
+        QMutexLocker locker(&s_mutex);
+        s_records.clear();
+        s_forward = forward;
+        s_previous = qInstallMessageHandler(handler);
+    }
+    ~MessageLog()
+    {
+        qInstallMessageHandler(s_previous);
+        QMutexLocker locker(&s_mutex);
+        s_records.clear();
+    }
+
+    // Every record as "<level>: <text>", level one of debug, warning, critical, fatal, info.
+    QStringList records() const
+    {
+        QMutexLocker locker(&s_mutex);
+        return s_records;
+    }
+
+    // The texts of the warning records only.
+    QStringList warnings() const
+    {
+        const QString prefix = QStringLiteral("warning: ");
+        QStringList result;
+        for (const QString &record : records()) {
+            if (record.startsWith(prefix))
+                result << record.mid(prefix.size());
+        }
+        return result;
+    }
+
+private:
+    static void handler(QtMsgType type, const QMessageLogContext &context, const QString &text)
+    {
+        static const char *const levels[] = { "debug", "warning", "critical", "fatal", "info" };
+        {
+            QMutexLocker locker(&s_mutex);
+            s_records.append(QLatin1String(levels[type]) + QLatin1String(": ") + text);
+        }
+        if (s_forward && s_previous)
+            s_previous(type, context, text);
+    }
+
+    static inline QMutex s_mutex;
+    static inline QStringList s_records;
+    static inline QtMessageHandler s_previous = nullptr;
+    static inline bool s_forward = true;
+
+    Q_DISABLE_COPY(MessageLog)
+};
+
+#endif
