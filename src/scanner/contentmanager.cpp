@@ -1,6 +1,8 @@
 #include "contentmanager.h"
 
 #include "dbmanager.h"
+#include "downloadmanager.h"
+#include "imagemanager.h"
 
 ContentManager::ContentManager() = default;
 
@@ -37,6 +39,12 @@ ContentManager *ContentManager::managerFromType(int type)
         return nullptr;
 
     switch (type) {
+    case ThemeletContent::Photo:
+        manager = new ImageManager(DbManager::instance());
+        break;
+    case ThemeletContent::Download:
+        manager = new DownloadManager(DbManager::instance());
+        break;
     default:
         // Managers of the remaining types are added with their subsystems.
         break;
