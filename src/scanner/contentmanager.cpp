@@ -31,13 +31,14 @@ bool ContentManager::remove(qint64)
 ContentManager *ContentManager::managerFromType(int type)
 {
     DbManager &database = DbManager::instance();
+    const ThemeletContent::Type key = ThemeletContent::Type(type);
     // The null entry stays, also for types that never get a manager.
-    ContentManager *&manager = database.m_contentManagers[ThemeletContent::Type(type)];
-    if (manager)
-        return manager;
+    if (ContentManager *existing = database.m_contentManagers[key])
+        return existing;
     if (uint(type) > 7 || type == 3 || type == 5)
         return nullptr;
 
+    ContentManager *manager = nullptr;
     switch (type) {
     case ThemeletContent::Photo:
         manager = new ImageManager(DbManager::instance());
@@ -49,6 +50,8 @@ ContentManager *ContentManager::managerFromType(int type)
         // Managers of the remaining types are added with their subsystems.
         break;
     }
+    // Looked up again: a constructor may have made other managers meanwhile.
+    database.m_contentManagers[key] = manager;
     return manager;
 }
 
