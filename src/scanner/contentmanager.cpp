@@ -2,6 +2,7 @@
 
 #include "dbmanager.h"
 #include "downloadmanager.h"
+#include "filemanager.h"
 #include "imagemanager.h"
 
 ContentManager::ContentManager() = default;
@@ -40,6 +41,9 @@ ContentManager *ContentManager::managerFromType(int type)
 
     ContentManager *manager = nullptr;
     switch (type) {
+    case ThemeletContent::File:
+        manager = new FileManager(DbManager::instance(), nullptr);
+        break;
     case ThemeletContent::Photo:
         manager = new ImageManager(DbManager::instance());
         break;
@@ -50,7 +54,8 @@ ContentManager *ContentManager::managerFromType(int type)
         // Managers of the remaining types are added with their subsystems.
         break;
     }
-    // Looked up again: a constructor may have made other managers meanwhile.
+    // Stored only now: a constructor may create other managers, which can
+    // rehash the table under a reference taken before.
     database.m_contentManagers[key] = manager;
     return manager;
 }
