@@ -2,6 +2,7 @@
 
 #include "dbmanager.h"
 #include "filemanager.h"
+#include "themeletmanager.h"
 
 ContentManager::ContentManager() = default;
 
@@ -40,6 +41,9 @@ ContentManager *ContentManager::managerFromType(int type)
     switch (type) {
     case ThemeletContent::File:
         manager = new FileManager(DbManager::instance(), nullptr);
+        break;
+    case ThemeletContent::Themelet:
+        manager = new ThemeletManager(DbManager::instance(), nullptr);
         break;
     default:
         // Managers of the remaining types are added with their subsystems.
