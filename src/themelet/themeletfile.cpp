@@ -3,6 +3,7 @@
 #include <QDateTime>
 #include <QDebug>
 #include <QFile>
+#include <QFileInfo>
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QJsonParseError>
@@ -24,8 +25,9 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
                                         const QString &batchTime)
 {
     const QString path = directory + QLatin1Char('/') + fileName;
+    // Only regular files: opening a FIFO would block the service.
     QFile file(path);
-    if (!file.open(QIODevice::ReadOnly))
+    if (!QFileInfo(path).isFile() || !file.open(QIODevice::ReadOnly))
         return Unreadable;
 
     QJsonParseError error { 0, QJsonParseError::NoError };

@@ -632,8 +632,10 @@ bool ThemeletManager::remove(qint64 id)
     if (content.isValid() && content.type() == ThemeletContent::Themelet) {
         // The pictures go whoever owns them; the file row and the tones stay.
         const Themelet themelet(content);
-        QFile::remove(themelet->homeWallpaper);
-        QFile::remove(themelet->applicationWallpaper);
+        for (const QString &wallpaper : { themelet->homeWallpaper, themelet->applicationWallpaper }) {
+            if (!wallpaper.isEmpty())
+                QFile::remove(wallpaper);
+        }
     }
 
     m_deleteThemelet.bindValue(0, id);

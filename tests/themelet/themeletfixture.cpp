@@ -1,6 +1,7 @@
 #include "themeletfixture.h"
 
 #include "contentmanager.h"
+#include "profiledefaults.h"
 #include "sysroot.h"
 #include "testdatabase.h"
 #include "themeletmanager.h"
@@ -27,7 +28,11 @@ void prepareSysroot()
     QFile::copy(QStringLiteral(THEMELET_TEST_CATALOGS "/themelet-sunset_eng_en.qm"),
                 translations + QLatin1String("themelet-sunset_eng_en.qm"));
 
-    writeFile(fallbackRingerTone(), QByteArray());
+    // Only the ringer has a fallback tone that exists.
+    writeFile(fallbackRingerTone(), QByteArray("ogg"));
+    writeFile(ProfileDefaults::path(),
+              QByteArray("[fallback]\nringing.alert.tone=") + fallbackRingerTone().toUtf8()
+                      + QByteArray("\nsms.alert.tone=/nowhere/sms.ogg\n"));
 }
 
 ThemeletManager *manager()
