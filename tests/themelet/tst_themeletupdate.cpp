@@ -318,11 +318,14 @@ void TestThemeletUpdate::malformed()
     const qint64 badId = addThemelet(*m_db, bad, content);
     m_db->exec(QStringLiteral("INSERT INTO themelet (fileId, favorite) VALUES (%1, 1)").arg(badId));
     const qint64 goodId = addThemelet(*m_db, makePackage(QStringLiteral("good")), R"({"wallpaper": "w.jpg"})");
+    m_db->exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, 42)").arg(goodId));
 
     expectParseFailure(bad + QLatin1String("/bad.themelet"), error, offset);
     QCOMPARE(m_manager->updateMetaData(), false);
 
-    QCOMPARE(m_db->rows(QStringLiteral("SELECT fileId FROM themelet")), QStringList { QString::number(goodId) });
+    // The merge passes over the deleted row and still matches the next one.
+    QCOMPARE(m_db->rows(QStringLiteral("SELECT fileId, ringerVolume FROM themelet")),
+             QStringList { QStringLiteral("%1|42").arg(goodId) });
     QCOMPARE(m_db->rows(QStringLiteral("SELECT metadataCurrent FROM file ORDER BY id")),
              (QStringList { QStringLiteral("1"), QStringLiteral("1") }));
 }
