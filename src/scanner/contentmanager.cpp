@@ -4,6 +4,7 @@
 #include "downloadmanager.h"
 #include "filemanager.h"
 #include "imagemanager.h"
+#include "themeletmanager.h"
 
 ContentManager::ContentManager() = default;
 
@@ -43,6 +44,9 @@ ContentManager *ContentManager::managerFromType(int type)
     switch (type) {
     case ThemeletContent::File:
         manager = new FileManager(DbManager::instance(), nullptr);
+        break;
+    case ThemeletContent::Themelet:
+        manager = new ThemeletManager(DbManager::instance(), nullptr);
         break;
     case ThemeletContent::Photo:
         manager = new ImageManager(DbManager::instance());
