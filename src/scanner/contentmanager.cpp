@@ -1,6 +1,8 @@
 #include "contentmanager.h"
 
 #include "dbmanager.h"
+#include "indexmanager.h"
+#include "installmanager.h"
 
 ContentManager::ContentManager() = default;
 
@@ -37,6 +39,13 @@ ContentManager *ContentManager::managerFromType(int type)
         return nullptr;
 
     switch (type) {
+    case 6:
+        // Its constructor creates the themelet and index managers first.
+        manager = new InstallManager(database, nullptr);
+        break;
+    case 7:
+        manager = new IndexManager(database);
+        break;
     default:
         // Managers of the remaining types are added with their subsystems.
         break;
