@@ -1,6 +1,7 @@
 #include "contentmanager.h"
 
 #include "dbmanager.h"
+#include "filemanager.h"
 #include "indexmanager.h"
 #include "installmanager.h"
 
@@ -32,13 +33,16 @@ ContentManager *ContentManager::managerFromType(int type)
 {
     DbManager &database = DbManager::instance();
     // The null entry stays, also for types that never get a manager.
-    ContentManager *&manager = database.m_contentManagers[ThemeletContent::Type(type)];
+    ContentManager *manager = database.m_contentManagers[ThemeletContent::Type(type)];
     if (manager)
         return manager;
     if (uint(type) > 7 || type == 3 || type == 5)
         return nullptr;
 
     switch (type) {
+    case ThemeletContent::File:
+        manager = new FileManager(DbManager::instance(), nullptr);
+        break;
     case 6:
         // Its constructor creates the themelet and index managers first.
         manager = new InstallManager(database, nullptr);
@@ -50,6 +54,9 @@ ContentManager *ContentManager::managerFromType(int type)
         // Managers of the remaining types are added with their subsystems.
         break;
     }
+    // Stored only now: a constructor may create other managers, which can
+    // rehash the table under a reference taken before.
+    database.m_contentManagers[ThemeletContent::Type(type)] = manager;
     return manager;
 }
 

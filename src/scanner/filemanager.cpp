@@ -1,0 +1,679 @@
+#include "filemanager.h"
+
+#include "content.h"
+#include "queryagentdatabase.h"
+
+#include <QCoreApplication>
+#include <QDebug>
+#include <QDirIterator>
+#include <QFile>
+#include <QFileInfo>
+#include <QSqlError>
+
+#include <algorithm>
+#include <cstdlib>
+#include <cstring>
+#include <memory>
+
+#include <sys/inotify.h>
+#include <sys/ioctl.h>
+#include <unistd.h>
+
+namespace {
+
+const char *const ConstructorSignature = "FileManager::FileManager(QueryAgentDatabase&, QObject*)";
+const char *const AppendSignature =
+        "qint64 FileManager::appendDirectory(const QString&, FileManager::DirectoryScope, FileManager::Scan)";
+const char *const WatchSignature =
+        "bool FileManager::watchDirectory(const QString&, qint64*, FileManager::DirectoryScope*)";
+const char *const ReadEventSignature = "bool FileManager::readEvent()";
+const char *const ScanSignature = "bool FileManager::scanDirectory()";
+const char *const InsertFileSignature = "qint64 FileManager::insertFile(const QString&)";
+
+const uint32_t UserScopeMask = IN_MODIFY | IN_MOVED_FROM | IN_MOVED_TO | IN_CREATE | IN_DELETE
+        | IN_DELETE_SELF | IN_MOVE_SELF | IN_DONT_FOLLOW;
+const uint32_t InstallScopeMask = IN_MODIFY | IN_MOVED_FROM | IN_DELETE | IN_DELETE_SELF
+        | IN_MOVE_SELF | IN_DONT_FOLLOW;
+const uint32_t IndexScopeMask = IN_MODIFY | IN_DONT_FOLLOW;
+static_assert(UserScopeMask == 0x2000fc2 && InstallScopeMask == 0x2000e42
+                      && IndexScopeMask == 0x2000002,
+              "inotify masks of the scopes");
+
+const uint32_t SelfGoneMask = IN_DELETE_SELF | IN_MOVE_SELF;          // 0xc00
+const uint32_t ArrivedMask = IN_CREATE | IN_MOVED_TO;                  // 0x180
+const uint32_t LeftMask = IN_MOVED_FROM | IN_DELETE | IN_DELETE_SELF;  // 0x640
+
+const int StackBufferSize = 4096;
+
+struct Statement
+{
+    QSqlQuery FileManager::*query;
+    const char *text;
+    const char *failure; // null: fail without a report
+};
+
+// One entry of a directory listing, keyed by its name in UTF-8.
+struct DiskEntry
+{
+    QByteArray name;
+    QString path;
+    QString fileName;
+    QDateTime modified;
+};
+
+bool byName(const DiskEntry &a, const DiskEntry &b)
+{
+    return qstrcmp(a.name, b.name) < 0;
+}
+
+// Walks a directory listing sorted by UTF-8 bytes against rows in ORDER BY
+// order. When the listing runs out on an entry that sorts before the current
+// row, that row has been fetched and is left alone: only the rows after it
+// count as gone.
+template <typename RowName, typename OnNew, typename OnGone, typename OnSame>
+void mergeSorted(QSqlQuery &rows, const QVector<DiskEntry> &entries, RowName rowName,
+                 OnNew onNew, OnGone onGone, OnSame onSame)
+{
+    int i = 0;
+    bool exhausted = entries.isEmpty();
+    while (!exhausted && rows.next()) {
+        const QByteArray name = rowName(rows);
+        int order = 0;
+        while ((order = qstrcmp(entries.at(i).name, name)) < 0) {
+            onNew(entries.at(i));
+            if (++i == entries.size()) {
+                exhausted = true;
+                break;
+            }
+        }
+        if (order < 0)
+            break;
+        if (order > 0) {
+            onGone(rows);
+        } else {
+            onSame(entries.at(i), rows);
+            exhausted = ++i == entries.size();
+        }
+    }
+    if (exhausted) {
+        while (rows.next())
+            onGone(rows);
+    } else {
+        for (; i < entries.size(); ++i)
+            onNew(entries.at(i));
+    }
+}
+
+}
+
+FileManager::FileManager(QueryAgentDatabase &database, QObject *parent)
+    : QSocketNotifier(inotify_init1(IN_NONBLOCK | IN_CLOEXEC), QSocketNotifier::Read, parent)
+    , QueryActor(database)
+    , m_fileQuery(database)
+    , m_fileInsert(database)
+    , m_fileSyncUpdate(database)
+    , m_fileSyncDelete(database)
+    , m_fileMonitorUpdate(database)
+    , m_fileMonitorDelete(database)
+    , m_directoryQuery(database)
+    , m_directoryInsert(database)
+    , m_directoryDelete(database)
+    , m_directoryIdQuery(database)
+    , m_fileIdQuery(database)
+    , m_directoryAppend(database)
+    , m_directoryScopeUpdate(database)
+    , m_directoryParentUpdate(database)
+    , m_inotifyFd(int(socket()))
+{
+    m_timer.start();
+
+    if (m_inotifyFd < 0) {
+        qWarning("%s", ConstructorSignature);
+        qWarning("Failed to initialize inotify");
+        return;
+    }
+
+    if (!transaction()) {
+        qWarning("%s", ConstructorSignature);
+        qWarning("Failed to open transation on database");
+        qWarning() << database.lastError();
+        return;
+    }
+
+    const QByteArray directoryInsert =
+            QStringLiteral("INSERT INTO directory ( parentId, path, scope) VALUES (?, ?, %1);")
+                    .arg(int(UserScope))
+                    .toUtf8();
+    const Statement statements[] = {
+        { &FileManager::m_fileQuery,
+          "SELECT id, fileName, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
+          "Failed to prepare m_fileQuery." },
+        { &FileManager::m_fileInsert,
+          "INSERT INTO file ( directoryId, mimeType, fileName, modificationTime, permissions, metadataCurrent) VALUES (?, ?, ?, ?, 3, 0);",
+          "Failed to prepare m_fileInsert." },
+        { &FileManager::m_fileSyncUpdate,
+          "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE id = ?;",
+          "Failed to prepare m_fileSyncUpdate." },
+        { &FileManager::m_fileSyncDelete, "DELETE FROM file WHERE id = ?;",
+          "Failed to prepare m_fileSyncDelete." },
+        { &FileManager::m_fileMonitorUpdate,
+          "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE directoryId = ? AND fileName = ?;",
+          "Failed to prepare m_fileMonitorUpdate." },
+        { &FileManager::m_fileMonitorDelete, "DELETE FROM file WHERE directoryId = ? AND fileName = ?;",
+          "Failed to prepare m_fileMonitorDelete." },
+        { &FileManager::m_directoryQuery,
+          "SELECT id, path FROM directory WHERE parentId = ? ORDER BY path ASC;",
+          "Failed to prepare m_directoryQuery." },
+        { &FileManager::m_directoryInsert, directoryInsert.constData(),
+          "Failed to prepare m_directoryInsert." },
+        { &FileManager::m_directoryDelete, "DELETE FROM directory WHERE id = ?;",
+          "Failed to prepare m_directoryDelete." },
+        { &FileManager::m_directoryIdQuery, "SELECT id, scope FROM directory WHERE path = ?;",
+          "Failed to prepare m_directoryIdQuery." },
+        { &FileManager::m_fileIdQuery, "SELECT id FROM file WHERE directoryId = ? AND fileName = ?;",
+          "Failed to prepare m_fileIdQuery." },
+        { &FileManager::m_directoryAppend, "INSERT INTO directory ( path, scope) VALUES(?, ?);",
+          "Failed to prepare m_directoryAppend." },
+        // Its failure has always been silent and leaves the transaction open.
+        { &FileManager::m_directoryScopeUpdate, "UPDATE directory SET scope = ? WHERE id = ?;", nullptr },
+        { &FileManager::m_directoryParentUpdate, "UPDATE directory SET parentId = ? WHERE id = ?;",
+          "Failed to prepare m_directoryParentUpdate." },
+    };
+    for (const Statement &statement : statements) {
+        QSqlQuery &query = this->*statement.query;
+        query.setForwardOnly(true);
+        if (!query.prepare(QString::fromUtf8(statement.text))) {
+            if (statement.failure)
+                rollback(query, ConstructorSignature, statement.failure);
+            return;
+        }
+    }
+
+    commit();
+    m_initialized = true;
+
+    // Watches are not stored: every start scans all roots again.
+    QSqlQuery roots(database);
+    if (roots.exec(QStringLiteral("SELECT path FROM directory WHERE parentId IS NULL;"))) {
+        while (roots.next())
+            m_pendingDirectories.append(roots.value(0).toString());
+    } else {
+        qWarning("%s", ConstructorSignature);
+        qWarning("Failed to execute root path query");
+        qWarning() << roots.lastError();
+    }
+
+    postUpdate();
+}
+
+FileManager::~FileManager()
+{
+    // Closing the descriptor ends all watches.
+    if (m_inotifyFd >= 0)
+        ::close(m_inotifyFd);
+}
+
+bool FileManager::event(QEvent *event)
+{
+    switch (event->type()) {
+    case QEvent::SockAct:
+        readEvent();
+        return true;
+    case QEvent::UpdateRequest:
+        // Directories always go before metadata.
+        if (scanDirectory() || updateMetaData()) {
+            m_updateQueued = true;
+            QCoreApplication::postEvent(this, new QEvent(QEvent::UpdateRequest), Qt::NormalEventPriority);
+        } else {
+            m_updateQueued = false;
+        }
+        return true;
+    default:
+        return QSocketNotifier::event(event);
+    }
+}
+
+bool FileManager::updateMetaData()
+{
+    if (m_managers.isEmpty())
+        return false;
+    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
+    ContentManager *head = m_managers.first();
+    if (head && head->updateMetaData())
+        return true;
+    m_managers.removeFirst();
+    return !m_managers.isEmpty();
+}
+
+void FileManager::scheduleUpdate()
+{
+    m_managers = scannerManagers();
+    postUpdate();
+}
+
+void FileManager::postUpdate()
+{
+    if (m_updateQueued)
+        return;
+    m_updateQueued = true;
+    QCoreApplication::postEvent(this, new QEvent(QEvent::UpdateRequest), Qt::NormalEventPriority);
+}
+
+bool FileManager::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
+                            const char *function, const char *failure)
+{
+    if (columns.first().isEmpty())
+        return true;
+    for (int i = 0; i < columns.size(); ++i)
+        query.bindValue(i, columns.at(i));
+    if (!query.execBatch()) {
+        rollback(query, function, failure);
+        return false;
+    }
+    query.finish();
+    return true;
+}
+
+qint64 FileManager::appendDirectory(const QString &path, DirectoryScope scope, Scan scan)
+{
+    if (!m_initialized || !QFile::exists(path))
+        return 0;
+
+    m_directoryIdQuery.bindValue(0, path);
+    if (!m_directoryIdQuery.exec()) {
+        warn(m_directoryIdQuery, AppendSignature, "Failed to execute m_directoryIdQuery");
+        return 0;
+    }
+
+    qint64 id = 0;
+    if (m_directoryIdQuery.next()) {
+        id = m_directoryIdQuery.value(0).toLongLong();
+        const int oldScope = m_directoryIdQuery.value(1).toInt();
+        m_directoryIdQuery.finish();
+        if (oldScope == scope) {
+            if (scan != ScanAlways)
+                return id;
+        } else {
+            m_directoryScopeUpdate.bindValue(0, int(scope));
+            m_directoryScopeUpdate.bindValue(1, id);
+            if (!m_directoryScopeUpdate.exec()) {
+                warn(m_directoryScopeUpdate, AppendSignature, "Failed to execute m_directoryScopeUpdate.");
+                return id;
+            }
+            m_directoryScopeUpdate.finish();
+
+            // The next scan watches again, with the mask of the new scope.
+            const int wd = m_watches.key(WatchedDirectory { path + QLatin1Char('/'), 0 }, -1);
+            if (wd != -1) {
+                m_watches.remove(wd);
+                inotify_rm_watch(m_inotifyFd, wd);
+            }
+        }
+    } else {
+        m_directoryAppend.bindValue(0, path);
+        m_directoryAppend.bindValue(1, int(scope));
+        if (!m_directoryAppend.exec()) {
+            warn(m_directoryAppend, AppendSignature, "Failed to execute m_directoryAppend");
+            return 0;
+        }
+        id = m_directoryAppend.lastInsertId().toLongLong();
+        m_directoryAppend.finish();
+    }
+
+    if (scan == NoScan)
+        return id;
+
+    m_pendingDirectories.append(path);
+    postUpdate();
+    return id;
+}
+
+bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope *scope)
+{
+    m_directoryIdQuery.bindValue(0, path);
+    if (!m_directoryIdQuery.exec()) {
+        qWarning("%s", WatchSignature);
+        qWarning("Failed to execute m_directoryIdQuery.");
+        qWarning() << m_directoryIdQuery.lastError();
+        return false;
+    }
+    if (!m_directoryIdQuery.next())
+        return false;
+
+    *id = m_directoryIdQuery.value(0).toLongLong();
+    *scope = DirectoryScope(m_directoryIdQuery.value(1).toInt());
+    m_directoryIdQuery.finish();
+
+    if (*scope == PackageScope)
+        return true;
+
+    const QString watchedPath = path + QLatin1Char('/');
+    // A live watch means the directory is in step already.
+    if (m_watches.key(WatchedDirectory { watchedPath, 0 }, -1) != -1)
+        return false;
+
+    uint32_t mask = IndexScopeMask;
+    if (*scope == UserScope)
+        mask = UserScopeMask;
+    else if (*scope == InstallScope)
+        mask = InstallScopeMask;
+
+    const int wd = inotify_add_watch(m_inotifyFd, path.toUtf8().constData(), mask);
+    if (wd < 0)
+        qWarning() << "Failed to add listener" << wd << path; // indexed, but not watched
+    else
+        m_watches[wd] = WatchedDirectory { watchedPath, *id };
+    return true;
+}
+
+void FileManager::clearWatches()
+{
+    for (auto it = m_watches.constBegin(); it != m_watches.constEnd(); ++it)
+        inotify_rm_watch(m_inotifyFd, it.key());
+    m_watches = QHash<int, WatchedDirectory>();
+}
+
+bool FileManager::readEvent()
+{
+    int size = 0;
+    ioctl(m_inotifyFd, FIONREAD, &size);
+
+    alignas(struct inotify_event) char stackBuffer[StackBufferSize];
+    std::unique_ptr<char, decltype(&std::free)> heapBuffer(nullptr, &std::free);
+    char *buffer = stackBuffer;
+    if (size > StackBufferSize) {
+        heapBuffer.reset(static_cast<char *>(std::malloc(size_t(size))));
+        if (!heapBuffer)
+            qBadAlloc();
+        buffer = heapBuffer.get();
+    }
+
+    const ssize_t length = ::read(m_inotifyFd, buffer, size_t(qMax(size, 0)));
+
+    QVariantList updateTimes, updateDirectories, updateNames;
+    QVariantList insertDirectories, insertTypes, insertNames, insertTimes;
+    QVariantList directoryParents, directoryPaths;
+    QVariantList deleteDirectories, deleteNames;
+    QVariantList directoryDeletes;
+
+    const size_t headerSize = sizeof(struct inotify_event);
+    for (ssize_t offset = 0; length > 0 && size_t(length - offset) >= headerSize;) {
+        struct inotify_event header;
+        std::memcpy(&header, buffer + offset, headerSize);
+        const char *nameBytes = buffer + offset + headerSize;
+        const size_t nameSize = qMin<size_t>(header.len, size_t(length - offset) - headerSize);
+        offset += ssize_t(headerSize + header.len);
+
+        const WatchedDirectory directory =
+                m_watches.isEmpty() ? WatchedDirectory() : m_watches.value(header.wd);
+        // Unknown watches, the overflow event (wd -1) and IN_IGNORED after a removal.
+        if (directory.path.isEmpty())
+            continue;
+
+        QString name;
+        if (header.len > 0) {
+            const QByteArray bytes(nameBytes, int(strnlen(nameBytes, nameSize)));
+            name = QString::fromUtf8(bytes);
+            // A scan never lists such names, and the decoded path wouldn't lead back to the file.
+            if (name.toUtf8() != bytes) {
+                qWarning() << "Skipping a file name that is not valid UTF-8" << directory.path << bytes;
+                continue;
+            }
+        }
+        const QString path = directory.path + name;
+
+        if (header.mask & SelfGoneMask) {
+            directoryDeletes << directory.id;
+            if (!m_watches.isEmpty())
+                m_watches.remove(header.wd);
+            inotify_rm_watch(m_inotifyFd, header.wd);
+        } else if (header.mask & IN_ISDIR) {
+            // Directories moved in or out are ignored; a deleted one reports on its own watch.
+            if (header.mask & IN_CREATE) {
+                m_pendingDirectories.append(path);
+                directoryParents << directory.id;
+                directoryPaths << path;
+            }
+        } else if (header.mask & ArrivedMask) {
+            const QFileInfo info(path);
+            m_fileIdQuery.bindValue(0, directory.id);
+            m_fileIdQuery.bindValue(1, name);
+            if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
+                m_fileIdQuery.finish();
+                updateTimes << info.lastModified();
+                updateDirectories << directory.id;
+                updateNames << name;
+            } else {
+                m_fileIdQuery.finish();
+                insertDirectories << directory.id;
+                insertTypes << m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name();
+                insertNames << name;
+                insertTimes << info.lastModified();
+            }
+        } else if (header.mask & LeftMask) {
+            deleteDirectories << directory.id;
+            deleteNames << name;
+        } else if (header.mask & IN_MODIFY) {
+            updateTimes << QFileInfo(path).lastModified();
+            updateDirectories << directory.id;
+            updateNames << name;
+        }
+    }
+
+    if (!transaction()) {
+        qWarning("%s", ReadEventSignature);
+        qWarning("Failed to start transation");
+    }
+
+    // By kind, not in the order of the events: updates first, deletes last.
+    if (!execBatch(m_fileMonitorUpdate, { updateTimes, updateDirectories, updateNames },
+                   ReadEventSignature, "Failed to execute m_fileMonitorUpdate.")
+        || !execBatch(m_fileInsert, { insertDirectories, insertTypes, insertNames, insertTimes },
+                      ReadEventSignature, "Failed to execute m_fileInsert.")
+        || !execBatch(m_directoryInsert, { directoryParents, directoryPaths }, ReadEventSignature,
+                      "Failed to execute m_directoryInsert.")
+        || !execBatch(m_fileMonitorDelete, { deleteDirectories, deleteNames }, ReadEventSignature,
+                      "Failed to execute m_fileMonitorDelete.")
+        || !execBatch(m_directoryDelete, { directoryDeletes }, ReadEventSignature,
+                      "Failed to execute m_directoryDelete.")) {
+        return false;
+    }
+
+    commit();
+    postUpdate();
+    Content::signalChanged(0);
+    m_managers = scannerManagers();
+    return true;
+}
+
+bool FileManager::scanDirectory()
+{
+    if (m_pendingDirectories.isEmpty())
+        return false;
+
+    const QString path = m_pendingDirectories.takeFirst();
+    qint64 id = 0;
+    DirectoryScope scope = UserScope;
+    if (!watchDirectory(path, &id, &scope))
+        return !m_pendingDirectories.isEmpty();
+
+    QVector<DiskEntry> files;
+    QVector<DiskEntry> directories;
+    QDirIterator it(path, QDir::Dirs | QDir::Files | QDir::NoDotAndDotDot);
+    while (it.hasNext()) {
+        const QString entryPath = it.next();
+        const QFileInfo info = it.fileInfo();
+        if (!info.isDir()) {
+            // Also a link to a file: its own name, its target's time.
+            const QString fileName = info.fileName();
+            files.append({ fileName.toUtf8(), entryPath, fileName, info.lastModified() });
+        } else if (!info.isSymLink()) {
+            directories.append({ info.fileName().toUtf8(), entryPath, QString(), QDateTime() });
+        }
+    }
+    if (!files.isEmpty())
+        std::sort(files.begin(), files.end(), byName);
+    if (!directories.isEmpty())
+        std::sort(directories.begin(), directories.end(), byName);
+
+    QVariantList deleteIds;
+    QVariantList updateTimes, updateIds;
+    QVariantList insertDirectories, insertTypes, insertNames, insertTimes;
+
+    m_fileQuery.bindValue(0, id);
+    if (!m_fileQuery.exec()) {
+        warn(m_fileQuery, ScanSignature, "Failed to execute m_fileQuery");
+        return false;
+    }
+    mergeSorted(
+            m_fileQuery, files, [](const QSqlQuery &row) { return row.value(1).toString().toUtf8(); },
+            [&](const DiskEntry &file) {
+                if (scope != UserScope)
+                    return;
+                insertDirectories << id;
+                insertTypes << m_mimeDatabase.mimeTypeForFile(file.path, QMimeDatabase::MatchDefault).name();
+                insertNames << file.fileName;
+                insertTimes << file.modified;
+            },
+            [&](const QSqlQuery &row) { deleteIds << row.value(0); },
+            [&](const DiskEntry &file, const QSqlQuery &row) {
+                if ((scope == UserScope || scope == InstallScope)
+                    && file.modified != row.value(2).toDateTime()) {
+                    updateTimes << file.modified;
+                    updateIds << row.value(0);
+                }
+            });
+
+    QVariantList directoryDeletes;
+    QVariantList directoryParents, directoryPaths;
+    QVariantList reparentParents, reparentIds;
+
+    m_directoryQuery.bindValue(0, id);
+    if (!m_directoryQuery.exec()) {
+        warn(m_directoryQuery, ScanSignature, "Failed to execute m_directoryQuery");
+        return false;
+    }
+    const int prefixSize = path.size() + 1;
+    // Paths are queued before the transaction and stay queued after a rollback.
+    mergeSorted(
+            m_directoryQuery, directories,
+            [prefixSize](const QSqlQuery &row) { return row.value(1).toString().mid(prefixSize).toUtf8(); },
+            [&](const DiskEntry &directory) {
+                if (scope != UserScope)
+                    return;
+                directoryParents << id;
+                directoryPaths << directory.path;
+                m_pendingDirectories.append(directory.path);
+            },
+            [&](const QSqlQuery &row) { directoryDeletes << row.value(0); },
+            [&](const DiskEntry &, const QSqlQuery &row) {
+                m_pendingDirectories.append(row.value(1).toString());
+            });
+
+    transaction();
+
+    if (!execBatch(m_directoryDelete, { directoryDeletes }, ScanSignature,
+                   "Failed to execute m_directoryDelete."))
+        return false;
+
+    for (int i = 0; i < directoryPaths.size();) {
+        m_directoryIdQuery.bindValue(0, directoryPaths.at(i));
+        if (!m_directoryIdQuery.exec()) {
+            rollback(m_directoryIdQuery, ScanSignature, "Failed to execute m_directoryIdQuery.");
+            return false;
+        }
+        m_directoryIdQuery.finish();
+        // next() after finish() never has a row, so a directory already known
+        // under another parent is not adopted: its insert below fails on the
+        // unique path and the scan of this directory rolls back.
+        if (m_directoryIdQuery.next()) {
+            reparentParents << id;
+            reparentIds << m_directoryIdQuery.value(0);
+            directoryParents.removeAt(i);
+            directoryPaths.removeAt(i);
+            continue;
+        }
+        ++i;
+    }
+
+    if (!execBatch(m_directoryInsert, { directoryParents, directoryPaths }, ScanSignature,
+                   "Failed to execute m_directoryInsert.")
+        || !execBatch(m_directoryParentUpdate, { reparentParents, reparentIds }, ScanSignature,
+                      "Failed to execute m_directoryParentUpdate.")
+        || !execBatch(m_fileSyncDelete, { deleteIds }, ScanSignature,
+                      "Failed to execute m_fileSyncDelete.")
+        || !execBatch(m_fileSyncUpdate, { updateTimes, updateIds }, ScanSignature,
+                      "Failed to execute m_fileSyncUpdate.")
+        || !execBatch(m_fileInsert, { insertDirectories, insertTypes, insertNames, insertTimes },
+                      ScanSignature, "Failed to execute m_fileInsert.")) {
+        return false;
+    }
+
+    commit();
+    postUpdate();
+    Content::signalChanged(0);
+    m_managers = scannerManagers();
+    return true;
+}
+
+qint64 FileManager::insertFile(const QString &path)
+{
+    const QFileInfo info(path);
+    if (!info.exists())
+        return 0;
+
+    transaction();
+
+    const QString directory = info.absolutePath();
+    m_directoryIdQuery.bindValue(0, directory);
+    if (!m_directoryIdQuery.exec()) {
+        rollback(m_directoryIdQuery, InsertFileSignature, "Failed to execute m_directoryIdQuery.");
+        return 0;
+    }
+    qint64 directoryId = 0;
+    if (m_directoryIdQuery.next()) {
+        directoryId = m_directoryIdQuery.value(0).toLongLong();
+        m_directoryIdQuery.finish();
+    } else {
+        m_directoryIdQuery.finish();
+        m_directoryAppend.bindValue(0, directory);
+        m_directoryAppend.bindValue(1, int(InstallScope));
+        if (!m_directoryAppend.exec()) {
+            rollback(m_directoryAppend, InsertFileSignature, "Failed to execute m_directoryAppend.");
+            return 0;
+        }
+        directoryId = m_directoryAppend.lastInsertId().toLongLong();
+        m_directoryAppend.finish();
+    }
+
+    // Known or not: a watched directory is passed over, an unwatched one gets its watch.
+    m_pendingDirectories.append(directory);
+    postUpdate();
+
+    m_fileIdQuery.bindValue(0, directoryId);
+    m_fileIdQuery.bindValue(1, info.fileName());
+    if (!m_fileIdQuery.exec()) {
+        rollback(m_fileIdQuery, InsertFileSignature, "Failed to execute m_fileIdQuery.");
+        return 0;
+    }
+    qint64 id = 0;
+    if (m_fileIdQuery.next()) {
+        id = m_fileIdQuery.value(0).toLongLong();
+        m_fileIdQuery.finish();
+    } else {
+        m_fileIdQuery.finish();
+        m_fileInsert.bindValue(0, directoryId);
+        m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
+        m_fileInsert.bindValue(2, info.fileName());
+        m_fileInsert.bindValue(3, info.lastModified());
+        if (!m_fileInsert.exec()) {
+            rollback(m_fileInsert, InsertFileSignature, "Failed to execute m_fileInsert.");
+            return 0;
+        }
+        id = m_fileInsert.lastInsertId().toLongLong();
+        m_fileInsert.finish();
+    }
+
+    commit();
+    return id;
+}
