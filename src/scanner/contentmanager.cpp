@@ -4,6 +4,7 @@
 #include "filemanager.h"
 #include "indexmanager.h"
 #include "installmanager.h"
+#include "themeletmanager.h"
 
 ContentManager::ContentManager() = default;
 
@@ -42,6 +43,9 @@ ContentManager *ContentManager::managerFromType(int type)
     switch (type) {
     case ThemeletContent::File:
         manager = new FileManager(DbManager::instance(), nullptr);
+        break;
+    case ThemeletContent::Themelet:
+        manager = new ThemeletManager(DbManager::instance(), nullptr);
         break;
     case 6:
         // Its constructor creates the themelet and index managers first.

@@ -1,0 +1,302 @@
+// GLib before Qt: GIO has a struct member named "signals".
+#include <dconf.h>
+
+#include "dconfstore.h"
+
+#include <QDebug>
+#include <QGlobalStatic>
+#include <QUrl>
+
+Q_GLOBAL_STATIC(DConfStore, s_store)
+
+namespace {
+
+GVariant *toGVariant(const QVariant &value);
+
+GVariant *stringListToGVariant(const QStringList &list)
+{
+    GVariantBuilder builder;
+    g_variant_builder_init(&builder, G_VARIANT_TYPE_STRING_ARRAY);
+    for (const QString &item : list)
+        g_variant_builder_add(&builder, "s", item.toUtf8().constData());
+    return g_variant_builder_end(&builder);
+}
+
+GVariant *listToGVariant(const QVariantList &list)
+{
+    bool allStrings = true;
+    for (const QVariant &item : list)
+        allStrings = allStrings && item.userType() == QMetaType::QString;
+    if (allStrings) {
+        QStringList strings;
+        for (const QVariant &item : list)
+            strings.append(item.toString());
+        return stringListToGVariant(strings);
+    }
+
+    GVariantBuilder builder;
+    g_variant_builder_init(&builder, G_VARIANT_TYPE("av"));
+    for (const QVariant &item : list) {
+        GVariant *element = toGVariant(item);
+        if (!element) {
+            g_variant_builder_clear(&builder);
+            return nullptr;
+        }
+        g_variant_builder_add(&builder, "v", element);
+    }
+    return g_variant_builder_end(&builder);
+}
+
+// A floating reference, or null for a value the store can't hold.
+GVariant *toGVariant(const QVariant &value)
+{
+    switch (value.userType()) {
+    case QMetaType::Bool:
+        return g_variant_new_boolean(value.toBool());
+    case QMetaType::Int:
+    case QMetaType::Short:
+    case QMetaType::UShort:
+    case QMetaType::Char:
+    case QMetaType::SChar:
+    case QMetaType::UChar:
+        return g_variant_new_int32(value.toInt());
+    case QMetaType::UInt:
+        return g_variant_new_uint32(value.toUInt());
+    case QMetaType::Long:
+    case QMetaType::LongLong:
+        return g_variant_new_int64(value.toLongLong());
+    case QMetaType::ULong:
+    case QMetaType::ULongLong:
+        return g_variant_new_uint64(value.toULongLong());
+    case QMetaType::Float:
+    case QMetaType::Double:
+        return g_variant_new_double(value.toDouble());
+    case QMetaType::QString:
+        return g_variant_new_string(value.toString().toUtf8().constData());
+    case QMetaType::QByteArray:
+        // Replaces bytes that aren't UTF-8: a GVariant string must be valid.
+        return g_variant_new_string(QString::fromUtf8(value.toByteArray()).toUtf8().constData());
+    case QMetaType::QUrl:
+        return g_variant_new_string(value.toUrl().toString().toUtf8().constData());
+    case QMetaType::QStringList:
+        return stringListToGVariant(value.toStringList());
+    case QMetaType::QVariantList:
+        return listToGVariant(value.toList());
+    default:
+        break;
+    }
+    QVariant text = value;
+    if (value.isValid() && text.convert(QMetaType::QString))
+        return g_variant_new_string(text.toString().toUtf8().constData());
+    return nullptr;
+}
+
+QVariant fromGVariant(GVariant *value)
+{
+    const GVariantClass kind = g_variant_classify(value);
+    switch (kind) {
+    case G_VARIANT_CLASS_BOOLEAN:
+        return bool(g_variant_get_boolean(value));
+    case G_VARIANT_CLASS_BYTE:
+        return int(g_variant_get_byte(value));
+    case G_VARIANT_CLASS_INT16:
+        return int(g_variant_get_int16(value));
+    case G_VARIANT_CLASS_UINT16:
+        return int(g_variant_get_uint16(value));
+    case G_VARIANT_CLASS_INT32:
+        return int(g_variant_get_int32(value));
+    case G_VARIANT_CLASS_UINT32:
+        return uint(g_variant_get_uint32(value));
+    case G_VARIANT_CLASS_INT64:
+        return qlonglong(g_variant_get_int64(value));
+    case G_VARIANT_CLASS_UINT64:
+        return qulonglong(g_variant_get_uint64(value));
+    case G_VARIANT_CLASS_HANDLE:
+        return int(g_variant_get_handle(value));
+    case G_VARIANT_CLASS_DOUBLE:
+        return g_variant_get_double(value);
+    case G_VARIANT_CLASS_STRING:
+    case G_VARIANT_CLASS_OBJECT_PATH:
+    case G_VARIANT_CLASS_SIGNATURE:
+        return QString::fromUtf8(g_variant_get_string(value, nullptr));
+    case G_VARIANT_CLASS_VARIANT: {
+        GVariant *inner = g_variant_get_variant(value);
+        const QVariant result = fromGVariant(inner);
+        g_variant_unref(inner);
+        return result;
+    }
+    case G_VARIANT_CLASS_ARRAY:
+        if (g_variant_is_of_type(value, G_VARIANT_TYPE_STRING_ARRAY)) {
+            QStringList list;
+            const gsize count = g_variant_n_children(value);
+            for (gsize i = 0; i < count; ++i) {
+                const gchar *item = nullptr;
+                g_variant_get_child(value, i, "&s", &item);
+                list.append(QString::fromUtf8(item));
+            }
+            return list;
+        }
+        if (g_variant_is_of_type(value, G_VARIANT_TYPE_BYTESTRING)) {
+            return QByteArray(static_cast<const char *>(g_variant_get_data(value)),
+                              int(g_variant_get_size(value)));
+        }
+        Q_FALLTHROUGH();
+    case G_VARIANT_CLASS_TUPLE: {
+        QVariantList list;
+        const gsize count = g_variant_n_children(value);
+        for (gsize i = 0; i < count; ++i) {
+            GVariant *child = g_variant_get_child_value(value, i);
+            list.append(fromGVariant(child));
+            g_variant_unref(child);
+        }
+        return list;
+    }
+    default:
+        break;
+    }
+    return QVariant();
+}
+
+bool isDirPath(const QString &path)
+{
+    return path.endsWith(QLatin1Char('/'));
+}
+
+bool watchMatches(const QString &watched, const QString &changed)
+{
+    return watched == changed
+            || (isDirPath(watched) && changed.startsWith(watched))
+            || (isDirPath(changed) && watched.startsWith(changed));
+}
+
+}
+
+DConfStore *DConfStore::instance()
+{
+    return s_store.isDestroyed() ? nullptr : s_store();
+}
+
+DConfStore::DConfStore()
+    : m_client(dconf_client_new())
+{
+    g_signal_connect(m_client, "changed", G_CALLBACK(&DConfStore::changed), this);
+}
+
+DConfStore::~DConfStore()
+{
+    g_signal_handlers_disconnect_by_data(m_client, this);
+    dconf_client_sync(m_client);
+    g_object_unref(m_client);
+}
+
+bool DConfStore::isKey(const QString &path)
+{
+    return dconf_is_key(path.toUtf8().constData(), nullptr);
+}
+
+QVariant DConfStore::read(const QString &key) const
+{
+    if (!isKey(key))
+        return QVariant();
+    GVariant *value = dconf_client_read(m_client, key.toUtf8().constData());
+    if (!value)
+        return QVariant();
+    const QVariant result = fromGVariant(value);
+    g_variant_unref(value);
+    return result;
+}
+
+bool DConfStore::write(const QString &key, const QVariant &value)
+{
+    if (!isKey(key)) {
+        qWarning() << "bool DConfStore::write(const QString&, const QVariant&)"
+                   << "Invalid key" << key;
+        return false;
+    }
+    GVariant *data = nullptr;
+    if (value.isValid()) {
+        data = toGVariant(value);
+        if (!data) {
+            qWarning() << "bool DConfStore::write(const QString&, const QVariant&)"
+                       << "Unsupported value type" << value.typeName() << "for" << key;
+            return false;
+        }
+    }
+    GError *error = nullptr;
+    // Takes the floating reference of data.
+    if (!dconf_client_write_fast(m_client, key.toUtf8().constData(), data, &error)) {
+        qWarning() << "bool DConfStore::write(const QString&, const QVariant&)"
+                   << "Failed to write" << key << QString::fromUtf8(error->message);
+        g_error_free(error);
+        return false;
+    }
+    // A fast write is only queued; the process may exit right after a set.
+    dconf_client_sync(m_client);
+    return true;
+}
+
+QStringList DConfStore::list(const QString &dir) const
+{
+    QStringList names;
+    if (!dconf_is_dir(dir.toUtf8().constData(), nullptr))
+        return names;
+    gchar **items = dconf_client_list(m_client, dir.toUtf8().constData(), nullptr);
+    for (gchar **item = items; item && *item; ++item)
+        names.append(QString::fromUtf8(*item));
+    g_strfreev(items);
+    return names;
+}
+
+void DConfStore::watch(const QString &path, QObject *receiver, const Handler &handler)
+{
+    QList<Watch> &watches = m_watches[path];
+    // A fast watch reports a change made before the bus has the match rule
+    // once more when the rule arrives; the sync one reports each change once.
+    if (watches.isEmpty())
+        dconf_client_watch_sync(m_client, path.toUtf8().constData());
+    watches.append({ receiver, handler });
+}
+
+void DConfStore::unwatch(const QString &path, QObject *receiver)
+{
+    auto it = m_watches.find(path);
+    if (it == m_watches.end())
+        return;
+    for (int i = 0; i < it->size(); ++i) {
+        if (it->at(i).receiver == receiver) {
+            it->removeAt(i);
+            break;
+        }
+    }
+    if (it->isEmpty()) {
+        m_watches.erase(it);
+        dconf_client_unwatch_fast(m_client, path.toUtf8().constData());
+    }
+}
+
+void DConfStore::changed(DConfClient *, const char *prefix, const char *const *changes,
+                         const char *, void *self)
+{
+    const QString base = QString::fromUtf8(prefix);
+    for (const char *const *change = changes; change && *change; ++change)
+        static_cast<DConfStore *>(self)->dispatch(base + QString::fromUtf8(*change));
+}
+
+void DConfStore::dispatch(const QString &changedPath)
+{
+    for (auto it = m_watches.cbegin(); it != m_watches.cend(); ++it) {
+        if (watchMatches(it.key(), changedPath))
+            post(it.key(), changedPath);
+    }
+}
+
+void DConfStore::post(const QString &watchedPath, const QString &changedPath)
+{
+    // Queued, so that a notice never re-enters the code that made the change;
+    // a receiver destroyed meanwhile drops it.
+    for (const Watch &watch : m_watches.value(watchedPath)) {
+        const Handler handler = watch.handler;
+        QMetaObject::invokeMethod(watch.receiver, [handler, changedPath]() { handler(changedPath); },
+                                  Qt::QueuedConnection);
+    }
+}

@@ -1,0 +1,43 @@
+#include "themelettranslator.h"
+
+#include "sysroot.h"
+
+#include <QLocale>
+
+ThemeletTranslator::ThemeletTranslator()
+    : m_loaded(false)
+{
+}
+
+QString ThemeletTranslator::catalogDirectory()
+{
+    return Sysroot::path(QStringLiteral("/usr/share/translations/"));
+}
+
+void ThemeletTranslator::selectCatalog(const QString &catalog)
+{
+    if (catalog == m_catalog)
+        return;
+    m_loaded = false;
+    if (catalog.isEmpty())
+        return;
+
+    m_catalog = catalog;
+    const QString directory = catalogDirectory();
+    const bool engineering = m_engineeringTranslator.load(catalog + QLatin1String("_eng_en"), directory);
+    // The locale catalogues are looked up without a suffix.
+    const bool locale = m_localeTranslator.load(QLocale(), catalog, QStringLiteral("-"), directory,
+                                                QStringLiteral(""));
+    m_loaded = engineering || locale;
+}
+
+QString ThemeletTranslator::translate(const QString &text) const
+{
+    if (!m_loaded)
+        return text;
+    const QByteArray source = text.toUtf8();
+    QString translation = m_localeTranslator.translate(nullptr, source.constData(), nullptr, -1);
+    if (translation.isEmpty())
+        translation = m_engineeringTranslator.translate(nullptr, source.constData(), nullptr, -1);
+    return translation.isEmpty() ? text : translation;
+}

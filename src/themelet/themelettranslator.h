@@ -1,0 +1,34 @@
+#ifndef THEMELETTRANSLATOR_H
+#define THEMELETTRANSLATOR_H
+
+#include <QString>
+#include <QTranslator>
+
+// Translates the display names of one update batch. The catalogues stay loaded
+// while consecutive files name the same one.
+class ThemeletTranslator
+{
+public:
+    ThemeletTranslator();
+
+    // Switches to the catalogue a file names; an empty name switches translation
+    // off but keeps the remembered name, so that the same catalogue named again
+    // later in the batch stays off.
+    void selectCatalog(const QString &catalog);
+    bool isLoaded() const { return m_loaded; }
+
+    // The locale's translation, else the engineering one, else the text itself.
+    QString translate(const QString &text) const;
+
+    static QString catalogDirectory();
+
+private:
+    QTranslator m_localeTranslator;
+    QTranslator m_engineeringTranslator;
+    QString m_catalog;
+    bool m_loaded;
+
+    Q_DISABLE_COPY(ThemeletTranslator)
+};
+
+#endif
