@@ -1,7 +1,9 @@
 #include "contentmanager.h"
 
 #include "dbmanager.h"
+#include "downloadmanager.h"
 #include "filemanager.h"
+#include "imagemanager.h"
 #include "indexmanager.h"
 #include "installmanager.h"
 #include "themeletmanager.h"
@@ -46,6 +48,12 @@ ContentManager *ContentManager::managerFromType(int type)
         break;
     case ThemeletContent::Themelet:
         manager = new ThemeletManager(DbManager::instance(), nullptr);
+        break;
+    case ThemeletContent::Photo:
+        manager = new ImageManager(DbManager::instance());
+        break;
+    case ThemeletContent::Download:
+        manager = new DownloadManager(DbManager::instance());
         break;
     case 6:
         // Its constructor creates the themelet and index managers first.

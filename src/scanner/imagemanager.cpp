@@ -1,0 +1,113 @@
+#include "imagemanager.h"
+
+#include "content.h"
+#include "quillmetadata.h"
+#include "queryagentdatabase.h"
+
+#include <QDebug>
+#include <QImageReader>
+#include <QSqlError>
+
+namespace {
+
+const int BatchSize = 100;
+
+const char *const ImageUpdateStatement =
+        "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) VALUES (?, ?, ?, ?, ?);";
+const char *const ModifiedQueryStatement =
+        "SELECT file.id, directory.path, file.fileName FROM file LEFT JOIN directory ON file.directoryId = directory.id WHERE file.metadataCurrent = 0 AND file.mimeType GLOB 'image/*' LIMIT 100;";
+const char *const ModifiedResetStatement = "UPDATE file SET metadataCurrent = 1 WHERE id = ?;";
+
+const char *const ConstructorSignature = "ImageManager::ImageManager(QueryAgentDatabase&)";
+const char *const UpdateSignature = "virtual bool ImageManager::updateMetaData()";
+
+}
+
+ImageManager::ImageManager(QueryAgentDatabase &database)
+    : QueryActor(database)
+    , m_imageUpdate(database)
+    , m_modifiedQuery(database)
+    , m_modifiedReset(database)
+{
+    if (!transaction()) {
+        qWarning() << ConstructorSignature;
+        qWarning() << "Failed to open transation on database";
+        qWarning() << database.lastError();
+        commit();
+        return;
+    }
+
+    m_modifiedQuery.setForwardOnly(true);
+    if (!m_imageUpdate.prepare(QLatin1String(ImageUpdateStatement))) {
+        rollback(m_imageUpdate, ConstructorSignature, "Failed to prepare m_imageUpdate.");
+    } else if (!m_modifiedQuery.prepare(QLatin1String(ModifiedQueryStatement))
+               || !m_modifiedReset.prepare(QLatin1String(ModifiedResetStatement))) {
+        // The reset statement has no text of its own.
+        rollback(m_modifiedQuery, ConstructorSignature, "Failed to prepare m_modifiedQuery.");
+    }
+    commit();
+}
+
+ImageManager::~ImageManager() = default;
+
+QString ImageManager::mimeType() const
+{
+    return QStringLiteral("image/*");
+}
+
+bool ImageManager::updateMetaData()
+{
+    if (!m_modifiedQuery.exec()) {
+        warn(m_modifiedQuery, UpdateSignature, "Failed to execute m_modifiedQuery");
+        return false;
+    }
+
+    // Files are read while no transaction is open.
+    QVariantList ids;
+    QVariantList dates;
+    QVariantList widths;
+    QVariantList heights;
+    QVariantList orientations;
+    while (m_modifiedQuery.next()) {
+        const QString path = m_modifiedQuery.value(1).toString() + QLatin1Char('/')
+                + m_modifiedQuery.value(2).toString();
+        ids.append(m_modifiedQuery.value(0).toLongLong());
+
+        // Header only: -1 x -1 for anything unreadable, which still counts as read.
+        const QSize size = QImageReader(path, QByteArray()).size();
+        widths.append(size.width());
+        heights.append(size.height());
+
+        const QuillMetadata metadata(path, QuillMetadata::AllFormats);
+        dates.append(metadata.entry(QuillMetadata::DateTaken));
+        orientations.append(metadata.entry(QuillMetadata::Orientation));
+    }
+    m_modifiedQuery.finish();
+
+    if (ids.isEmpty())
+        return false;
+
+    transaction();
+
+    m_modifiedReset.addBindValue(ids);
+    if (!m_modifiedReset.execBatch()) {
+        rollback(m_modifiedReset, UpdateSignature, "Failed to execute m_modifiedReset.");
+        return false;
+    }
+    m_modifiedReset.finish();
+
+    m_imageUpdate.addBindValue(ids);
+    m_imageUpdate.addBindValue(dates);
+    m_imageUpdate.addBindValue(widths);
+    m_imageUpdate.addBindValue(heights);
+    m_imageUpdate.addBindValue(orientations);
+    if (!m_imageUpdate.execBatch()) {
+        rollback(m_imageUpdate, UpdateSignature, "Failed to execute m_imageUpdate.");
+        return false;
+    }
+    m_imageUpdate.finish();
+
+    commit();
+    Content::signalChanged(ThemeletContent::Photo);
+    return ids.count() == BatchSize;
+}
