@@ -57,10 +57,10 @@ ContentManager *ContentManager::managerFromType(int type)
         break;
     case 6:
         // Its constructor creates the themelet and index managers first.
-        manager = new InstallManager(database, nullptr);
+        manager = new InstallManager(DbManager::instance(), nullptr);
         break;
     case 7:
-        manager = new IndexManager(database);
+        manager = new IndexManager(DbManager::instance());
         break;
     default:
         // Managers of the remaining types are added with their subsystems.
@@ -70,6 +70,18 @@ ContentManager *ContentManager::managerFromType(int type)
     // rehash the table under a reference taken before.
     database.m_contentManagers[ThemeletContent::Type(type)] = manager;
     return manager;
+}
+
+bool ContentManager::updateFirst(QList<ContentManager *> &managers)
+{
+    if (managers.isEmpty())
+        return false;
+    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
+    ContentManager *head = managers.first();
+    if (head && head->updateMetaData())
+        return true;
+    managers.removeFirst();
+    return !managers.isEmpty();
 }
 
 QList<ContentManager *> ContentManager::scannerManagers()

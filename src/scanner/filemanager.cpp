@@ -235,14 +235,7 @@ bool FileManager::event(QEvent *event)
 
 bool FileManager::updateMetaData()
 {
-    if (m_managers.isEmpty())
-        return false;
-    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
-    ContentManager *head = m_managers.first();
-    if (head && head->updateMetaData())
-        return true;
-    m_managers.removeFirst();
-    return !m_managers.isEmpty();
+    return updateFirst(m_managers);
 }
 
 void FileManager::scheduleUpdate()

@@ -3,7 +3,7 @@
 #include "content.h"
 #include "filemanager.h"
 #include "queryagentdatabase.h"
-#include "sysroot.h"
+#include "themelettranslator.h"
 
 #include <QDateTime>
 #include <QDebug>
@@ -12,12 +12,9 @@
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
-#include <QLocale>
-#include <QTranslator>
 #include <QVector>
 
 #include <algorithm>
-#include <cstring>
 
 namespace {
 
@@ -27,39 +24,6 @@ const char *const UpdateSignature = "virtual bool IndexManager::updateMetaData()
 const char *const SelectModifiedIndex =
         "SELECT file.id, directory.id, directory.path, file.fileName FROM file LEFT JOIN directory ON file.directoryId = directory.id WHERE file.metadataCurrent = 0 AND file.mimeType = 'application/x-vorka-index' LIMIT 1;";
 const char *const UpdateDirectoryParent = "UPDATE directory SET parentId = ? WHERE id = ?";
-
-// The engineering catalogue and the one of the user's locale; the locale one wins.
-class IndexTranslator
-{
-public:
-    explicit IndexTranslator(const QString &catalog)
-    {
-        if (catalog.isEmpty())
-            return;
-        const QString directory = Sysroot::path(QStringLiteral("/usr/share/translations/"));
-        const bool engineering = m_engineering.load(catalog + QStringLiteral("_eng_en"), directory);
-        // ".qm" so that the plain catalogue is found also in the "C" locale.
-        const bool locale = m_locale.load(QLocale(), catalog, QStringLiteral("-"), directory,
-                                          QStringLiteral(".qm"));
-        m_enabled = engineering || locale;
-    }
-
-    QString translate(const QString &text) const
-    {
-        if (!m_enabled)
-            return text;
-        const QByteArray source = text.toUtf8();
-        QString translation = m_locale.translate(nullptr, source.constData(), nullptr, -1);
-        if (translation.isEmpty())
-            translation = m_engineering.translate(nullptr, source.constData(), nullptr, -1);
-        return translation.isEmpty() ? text : translation;
-    }
-
-private:
-    QTranslator m_engineering;
-    QTranslator m_locale;
-    bool m_enabled = false;
-};
 
 FileManager *fileManager()
 {
@@ -196,7 +160,9 @@ bool IndexManager::updateMetaData()
         warn(parentLink, UpdateSignature, "Failed to set directory parent ID.");
     parentLink.finish();
 
-    const IndexTranslator translator(root.value(QStringLiteral("translationCatalog")).toString());
+    // ".qm": in the "C" locale the plain catalogue is the locale's one.
+    ThemeletTranslator translator(QStringLiteral(".qm"));
+    translator.selectCatalog(root.value(QStringLiteral("translationCatalog")).toString());
 
     QVector<Entry> entries;
     QVector<QPair<QString, QString>> aliases;

@@ -129,13 +129,7 @@ void InstallManager::refreshInstalls()
 
 bool InstallManager::updateMetaData()
 {
-    if (m_managers.isEmpty())
-        return false;
-    ContentManager *head = m_managers.first();
-    if (head && head->updateMetaData())
-        return true;
-    m_managers.removeFirst();
-    return !m_managers.isEmpty();
+    return updateFirst(m_managers);
 }
 
 bool InstallManager::event(QEvent *event)

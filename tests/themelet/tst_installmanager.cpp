@@ -26,6 +26,7 @@ private slots:
     void setFavorite_data();
     void setFavorite();
     void manyPackages();
+    void packageRoad();
 
 private:
     static InstallManager *installer()
@@ -306,31 +307,85 @@ void tst_InstallManager::manyPackages()
     QVERIFY(FixtureFiles::write(installDir + QStringLiteral("/stray.index"), "{}"));
     const QString vanishing = installDir + QStringLiteral("/p1999");
 
-    // Each step is one directory or one package: a timer gets its turn long
-    // before the last package is in, and a queued package can vanish before
-    // its turn comes.
+    // Each step is one directory or one package: a timer gets its turn between
+    // any two packages, and a queued package can vanish before its turn comes.
     const QString installed = QStringLiteral("SELECT count(*) FROM file WHERE fileName = 'p.index'");
     const int installedBefore = m_db->value(installed).toInt();
-    int installedAtVanishing = -1;
+    QSet<int> seenByTimer;
+    bool vanished = false;
     QTimer timer;
     timer.setInterval(0);
     connect(&timer, &QTimer::timeout, this, [&] {
-        if (!directoryId(vanishing).isValid())
-            return;
-        installedAtVanishing = m_db->value(installed).toInt() - installedBefore;
-        QVERIFY(QDir(vanishing).removeRecursively());
-        timer.stop();
+        seenByTimer.insert(m_db->value(installed).toInt() - installedBefore);
+        if (!vanished && directoryId(vanishing).isValid())
+            vanished = QDir(vanishing).removeRecursively();
     });
     timer.start();
     QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^Error parsing index from file .*broken.index"));
     installer()->appendDirectory(installDir);
     QVERIFY(EventLoopIdle::wait());
+    timer.stop();
 
-    QVERIFY2(installedAtVanishing >= 0 && installedAtVanishing < count / 2,
-             qPrintable(QString::number(installedAtVanishing)));
+    QVERIFY(vanished);
+    QVERIFY2(seenByTimer.size() > count / 2, qPrintable(QString::number(seenByTimer.size())));
     QCOMPARE(m_db->value(installed).toInt() - installedBefore, count - 1);
     QCOMPARE(m_db->value(QStringLiteral("SELECT count(*) FROM file WHERE mimeType = 'application/x-vorka-index' "
                                         "AND metadataCurrent = 0")).toInt(), 0);
+}
+
+void tst_InstallManager::packageRoad()
+{
+    const QString package = InstallManager::installPaths().at(0) + QStringLiteral("/sunset");
+    QVERIFY(FixtureFiles::write(package + QStringLiteral("/images/sunset.jpg"), "jpeg"));
+    QVERIFY(FixtureFiles::write(package + QStringLiteral("/images/dawn.jpg"), "jpeg"));
+    QVERIFY(FixtureFiles::write(package + QStringLiteral("/sounds/dusk.ogg"), "ogg"));
+    QVERIFY(FixtureFiles::write(package + QStringLiteral("/sunset.themelet"), R"({"wallpaper": "sunset.jpg",
+        "displayName": "Sunset", "ringerVolume": 60, "ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
+
+    // What the service does at its start.
+    for (const QString &path : InstallManager::installPaths()) {
+        QVERIFY(QDir().mkpath(path));
+        installer()->appendDirectory(path);
+    }
+    QVERIFY(EventLoopIdle::wait());
+
+    const QString fileId = m_db->value(QStringLiteral("SELECT file.id FROM file JOIN directory ON directory.id = file.directoryId "
+                                                      "WHERE directory.path = '%1' AND fileName = 'sunset.themelet'")
+                                               .arg(package))
+                                   .toString();
+    QVERIFY(!fileId.isEmpty());
+    const QString fileState = QStringLiteral("SELECT file.permissions, file.mimeType, file.metadataCurrent, file.displayName, "
+                                             "directory.scope, directory.parentId = (SELECT id FROM directory WHERE path = '%1') "
+                                             "FROM file JOIN directory ON directory.id = file.directoryId WHERE file.id = %2")
+                                      .arg(InstallManager::installPaths().at(0), fileId);
+    const QString themeletState = QStringLiteral("SELECT themelet.homeWallpaper, themelet.ringerVolume, resource.resourceType, "
+                                                 "tone.fileName FROM themelet JOIN resource ON resource.fileId = themelet.fileId "
+                                                 "JOIN file AS tone ON tone.id = resource.resourceId WHERE themelet.fileId = %1")
+                                          .arg(fileId);
+    QCOMPARE(m_db->rows(fileState), QStringList { "1|application/x-vorka-themelet|1|Sunset|2|1" });
+    QCOMPARE(m_db->rows(themeletState),
+             QStringList { package + QStringLiteral("/images/sunset.jpg|60|ringerToneFile|dusk.ogg") });
+
+    // A changed file is read again at the next install, into the same rows.
+    QVERIFY(FixtureFiles::write(package + QStringLiteral("/sunset.themelet"), R"({"wallpaper": "dawn.jpg",
+        "displayName": "Dawn", "ringerVolume": 10, "ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
+    installer()->appendDirectory(InstallManager::installPaths().at(0));
+    QVERIFY(EventLoopIdle::wait());
+    QCOMPARE(m_db->rows(fileState), QStringList { "1|application/x-vorka-themelet|1|Dawn|2|1" });
+    QCOMPARE(m_db->rows(themeletState),
+             QStringList { package + QStringLiteral("/images/dawn.jpg|60|ringerToneFile|dusk.ogg") });
+
+    // A package that is gone takes its rows along.
+    QVERIFY(QDir(package).removeRecursively());
+    installer()->appendDirectory(InstallManager::installPaths().at(0));
+    QVERIFY(EventLoopIdle::wait());
+    QVERIFY(!directoryId(package).isValid());
+    QCOMPARE(m_db->value(QStringLiteral("SELECT (SELECT count(*) FROM file WHERE id = %1) "
+                                        "+ (SELECT count(*) FROM themelet WHERE fileId = %1) "
+                                        "+ (SELECT count(*) FROM resource WHERE fileId = %1)")
+                                 .arg(fileId))
+                     .toInt(),
+             0);
 }
 
 QTEST_GUILESS_MAIN(tst_InstallManager)
