@@ -252,21 +252,6 @@ void FileManager::postUpdate()
     QCoreApplication::postEvent(this, new QEvent(QEvent::UpdateRequest), Qt::NormalEventPriority);
 }
 
-bool FileManager::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
-                            const char *function, const char *failure)
-{
-    if (columns.first().isEmpty())
-        return true;
-    for (int i = 0; i < columns.size(); ++i)
-        query.bindValue(i, columns.at(i));
-    if (!query.execBatch()) {
-        rollback(query, function, failure);
-        return false;
-    }
-    query.finish();
-    return true;
-}
-
 qint64 FileManager::appendDirectory(const QString &path, DirectoryScope scope, Scan scan)
 {
     if (!m_initialized || !QFile::exists(path))

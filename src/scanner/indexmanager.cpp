@@ -74,35 +74,23 @@ IndexManager::IndexManager(QueryAgentDatabase &database)
     , m_modifiedReset(database)
     , m_renameQuery(database)
 {
-    struct Statement
-    {
-        QSqlQuery *query;
-        const char *text;
-        const char *failure;
-    };
-    const Statement statements[] = {
-        { &m_fileQuery,
-          "SELECT id, fileName, displayName, category, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
-          "Failed to prepare m_fileQuery." },
-        { &m_fileInsert,
-          "INSERT INTO file ( directoryId, mimeType, fileName, displayName, category, modificationTime, permissions, metadataCurrent) VALUES(?, ?, ?, ?, ?, ?, 1, 0)",
-          "Failed to prepare m_fileInsert." },
-        { &m_fileUpdate,
-          "UPDATE file SET mimeType = ?, displayName = ?, category = ?, modificationTime = ?, metadataCurrent = 0 WHERE id = ?;",
-          "Failed to prepare m_fileUpdate." },
-        { &m_fileDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileDelete." },
-        { &m_modifiedReset, "UPDATE file SET metadataCurrent = 1 WHERE id = ?;",
-          "Failed to prepare m_modifiedReset." },
-        { &m_renameQuery, "UPDATE file SET fileName = ? WHERE directoryId = ? AND fileName = ?;",
-          "Failed to prepare m_renameQuery." },
-    };
     // No transaction is open here: the rollback after a failure has nothing to undo.
-    for (const Statement &statement : statements) {
-        if (!statement.query->prepare(QString::fromLatin1(statement.text))) {
-            rollback(*statement.query, ConstructorSignature, statement.failure);
-            return;
-        }
-    }
+    prepareStatements({
+            { &m_fileQuery,
+              "SELECT id, fileName, displayName, category, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
+              "Failed to prepare m_fileQuery." },
+            { &m_fileInsert,
+              "INSERT INTO file ( directoryId, mimeType, fileName, displayName, category, modificationTime, permissions, metadataCurrent) VALUES(?, ?, ?, ?, ?, ?, 1, 0)",
+              "Failed to prepare m_fileInsert." },
+            { &m_fileUpdate,
+              "UPDATE file SET mimeType = ?, displayName = ?, category = ?, modificationTime = ?, metadataCurrent = 0 WHERE id = ?;",
+              "Failed to prepare m_fileUpdate." },
+            { &m_fileDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileDelete." },
+            { &m_modifiedReset, "UPDATE file SET metadataCurrent = 1 WHERE id = ?;",
+              "Failed to prepare m_modifiedReset." },
+            { &m_renameQuery, "UPDATE file SET fileName = ? WHERE directoryId = ? AND fileName = ?;",
+              "Failed to prepare m_renameQuery." },
+    }, ConstructorSignature);
 }
 
 IndexManager::~IndexManager() = default;
@@ -312,38 +300,16 @@ void IndexManager::merge(const QVector<Entry> &entries, qint64 directoryId, Chan
 bool IndexManager::writeChanges(const Changes &changes)
 {
     transaction();
-    if (!changes.deleteIds.isEmpty()) {
-        m_fileDelete.bindValue(0, changes.deleteIds);
-        if (!m_fileDelete.execBatch()) {
-            rollback(m_fileDelete, UpdateSignature, "Failed to execute m_fileDelete.");
-            return false;
-        }
-        m_fileDelete.finish();
-    }
-    if (!changes.updateIds.isEmpty()) {
-        m_fileUpdate.bindValue(0, changes.updateMimeTypes);
-        m_fileUpdate.bindValue(1, changes.updateDisplayNames);
-        m_fileUpdate.bindValue(2, changes.updateCategories);
-        m_fileUpdate.bindValue(3, changes.updateTimes);
-        m_fileUpdate.bindValue(4, changes.updateIds);
-        if (!m_fileUpdate.execBatch()) {
-            rollback(m_fileUpdate, UpdateSignature, "Failed to execute m_fileUpdate.");
-            return false;
-        }
-        m_fileUpdate.finish();
-    }
-    if (!changes.insertFileNames.isEmpty()) {
-        m_fileInsert.bindValue(0, changes.insertDirectoryIds);
-        m_fileInsert.bindValue(1, changes.insertMimeTypes);
-        m_fileInsert.bindValue(2, changes.insertFileNames);
-        m_fileInsert.bindValue(3, changes.insertDisplayNames);
-        m_fileInsert.bindValue(4, changes.insertCategories);
-        m_fileInsert.bindValue(5, changes.insertTimes);
-        if (!m_fileInsert.execBatch()) {
-            rollback(m_fileInsert, UpdateSignature, "Failed to execute m_fileInsert.");
-            return false;
-        }
-        m_fileInsert.finish();
+    if (!execBatch(m_fileDelete, { changes.deleteIds }, UpdateSignature, "Failed to execute m_fileDelete.")
+            || !execBatch(m_fileUpdate,
+                          { changes.updateMimeTypes, changes.updateDisplayNames, changes.updateCategories,
+                            changes.updateTimes, changes.updateIds },
+                          UpdateSignature, "Failed to execute m_fileUpdate.")
+            || !execBatch(m_fileInsert,
+                          { changes.insertDirectoryIds, changes.insertMimeTypes, changes.insertFileNames,
+                            changes.insertDisplayNames, changes.insertCategories, changes.insertTimes },
+                          UpdateSignature, "Failed to execute m_fileInsert.")) {
+        return false;
     }
     commit();
     return true;

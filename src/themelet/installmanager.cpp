@@ -67,39 +67,28 @@ InstallManager::InstallManager(QueryAgentDatabase &database, QObject *parent)
 {
     m_timer.start();
 
-    struct Statement
-    {
-        QSqlQuery *query;
-        const char *text;
-        const char *failure;
-    };
-    const Statement statements[] = {
-        { &m_fileQuery, "SELECT id, fileName, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
-          "Failed to prepare m_fileQuery." },
-        { &m_fileInsert,
-          "INSERT INTO file ( directoryId, mimeType, fileName, modificationTime, permissions, metadataCurrent) VALUES(?, ?, ?, ?, 1, 0)",
-          "Failed to prepare m_fileInsert." },
-        { &m_fileSyncUpdate, "UPDATE file SET modificationTime = ?, permissions = 1, metadataCurrent = 0 WHERE id = ?;",
-          "Failed to prepare m_fileSyncUpdate." },
-        { &m_fileSyncDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileSyncDelete." },
-        { &m_directoryIdQuery, "SELECT id FROM directory WHERE path = ?;", "Failed to prepare m_directoryIdQuery." },
-        { &m_directoryInsert, "INSERT INTO directory ( parentId, path, scope) VALUES (?, ?, ?);",
-          "Failed to prepare m_directoryInsert." },
-        { &m_directoryUpdate, "UPDATE directory SET parentId = ?, scope = ? WHERE id = ?;",
-          "Failed to prepare m_directoryUpdate." },
-        { &m_directoryDelete, "DELETE FROM directory WHERE id = ?;", "Failed to prepare m_directoryDelete." },
-        { &m_zefIdQuery,
-          "SELECT file.id, zefid.zefId FROM file LEFT JOIN zefid ON file.id = zefid.fileId WHERE directoryId = ? AND fileName = ?;",
-          "Failed to prepare m_zefIdQuery." },
-        { &m_zefIdInsert, "INSERT INTO zefid ( fileId, zefId) VALUES(?, ?)", "Failed to prepare m_zefIdInsert." },
-        { &m_zefIdUpdate, "UPDATE zefid SET zefId = ? WHERE fileId = ?;", "Failed to prepare m_zefIdUpdate." },
-    };
-    for (const Statement &statement : statements) {
-        if (!statement.query->prepare(QString::fromLatin1(statement.text))) {
-            rollback(*statement.query, ConstructorSignature, statement.failure);
-            break;
-        }
-    }
+    prepareStatements({
+            { &m_fileQuery, "SELECT id, fileName, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
+              "Failed to prepare m_fileQuery." },
+            { &m_fileInsert,
+              "INSERT INTO file ( directoryId, mimeType, fileName, modificationTime, permissions, metadataCurrent) VALUES(?, ?, ?, ?, 1, 0)",
+              "Failed to prepare m_fileInsert." },
+            { &m_fileSyncUpdate, "UPDATE file SET modificationTime = ?, permissions = 1, metadataCurrent = 0 WHERE id = ?;",
+              "Failed to prepare m_fileSyncUpdate." },
+            // Never executed: install leaves gone files to the FileManager scan.
+            { &m_fileSyncDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileSyncDelete." },
+            { &m_directoryIdQuery, "SELECT id FROM directory WHERE path = ?;", "Failed to prepare m_directoryIdQuery." },
+            { &m_directoryInsert, "INSERT INTO directory ( parentId, path, scope) VALUES (?, ?, ?);",
+              "Failed to prepare m_directoryInsert." },
+            { &m_directoryUpdate, "UPDATE directory SET parentId = ?, scope = ? WHERE id = ?;",
+              "Failed to prepare m_directoryUpdate." },
+            { &m_directoryDelete, "DELETE FROM directory WHERE id = ?;", "Failed to prepare m_directoryDelete." },
+            { &m_zefIdQuery,
+              "SELECT file.id, zefid.zefId FROM file LEFT JOIN zefid ON file.id = zefid.fileId WHERE directoryId = ? AND fileName = ?;",
+              "Failed to prepare m_zefIdQuery." },
+            { &m_zefIdInsert, "INSERT INTO zefid ( fileId, zefId) VALUES(?, ?)", "Failed to prepare m_zefIdInsert." },
+            { &m_zefIdUpdate, "UPDATE zefid SET zefId = ? WHERE fileId = ?;", "Failed to prepare m_zefIdUpdate." },
+    }, ConstructorSignature);
 
     refreshInstalls();
 }
@@ -225,15 +214,9 @@ bool InstallManager::scanInstallDirectory()
     }
 
     transaction();
-    if (!deleteIds.isEmpty()) {
-        // The directory trigger takes the package's files and their rows along.
-        m_directoryDelete.bindValue(0, deleteIds);
-        if (!m_directoryDelete.execBatch()) {
-            rollback(m_directoryDelete, ScanSignature, "Failed to execute m_directoryDelete.");
-            return false;
-        }
-        m_directoryDelete.finish();
-    }
+    // The directory trigger takes the package's files and their rows along.
+    if (!execBatch(m_directoryDelete, { deleteIds }, ScanSignature, "Failed to execute m_directoryDelete."))
+        return false;
 
     // A package known as a root or under another parent is adopted, not duplicated.
     for (int n = 0; n < newPaths.size();) {
@@ -354,28 +337,13 @@ bool InstallManager::install(const QString &path, const QString &zefId, bool for
         insert(entries.at(i));
 
     transaction();
-    if (!updateIds.isEmpty()) {
-        m_fileSyncUpdate.bindValue(0, updateTimes);
-        m_fileSyncUpdate.bindValue(1, updateIds);
-        if (!m_fileSyncUpdate.execBatch()) {
-            rollback(m_fileSyncUpdate, InstallSignature, "Failed to execute m_fileSyncUpdate.");
-            return false;
-        }
-        m_fileSyncUpdate.finish();
-    }
-    if (!insertFileNames.isEmpty()) {
-        m_fileInsert.bindValue(0, insertDirectoryIds);
-        m_fileInsert.bindValue(1, insertMimeTypes);
-        m_fileInsert.bindValue(2, insertFileNames);
-        m_fileInsert.bindValue(3, insertTimes);
-        if (!m_fileInsert.execBatch()) {
-            rollback(m_fileInsert, InstallSignature, "Failed to execute m_fileInsert.");
-            return false;
-        }
-        m_fileInsert.finish();
-    }
-    if (!bindZefIds(directoryId, themeletNames, zefId))
+    if (!execBatch(m_fileSyncUpdate, { updateTimes, updateIds }, InstallSignature,
+                   "Failed to execute m_fileSyncUpdate.")
+            || !execBatch(m_fileInsert, { insertDirectoryIds, insertMimeTypes, insertFileNames, insertTimes },
+                          InstallSignature, "Failed to execute m_fileInsert.")
+            || !bindZefIds(directoryId, themeletNames, zefId)) {
         return false;
+    }
     commit();
 
     if (!insertFileNames.isEmpty() || !updateIds.isEmpty())
