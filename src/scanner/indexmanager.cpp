@@ -119,8 +119,9 @@ bool IndexManager::updateMetaData()
     }
     m_modifiedReset.finish();
 
+    // Only regular files: opening a FIFO would block the whole loop.
     QFile file(indexPath);
-    if (!file.open(QIODevice::ReadOnly))
+    if (!QFileInfo(indexPath).isFile() || !file.open(QIODevice::ReadOnly))
         return true;
 
     QJsonParseError error;

@@ -9,6 +9,7 @@
 #include <QtTest>
 
 #include <memory>
+#include <sys/stat.h>
 
 using namespace PackageFixture;
 
@@ -218,6 +219,12 @@ void tst_IndexManager::changeNotices()
     QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
     QCOMPARE(rows(), QStringList { "a.ogg|A2|NULL" });
     QVERIFY(!indexes->updateMetaData());
+
+    // An index that became a FIFO is passed over, not waited for.
+    QVERIFY(QFile::remove(index()) && ::mkfifo(QFile::encodeName(index()).constData(), 0644) == 0);
+    QVERIFY(m_db->exec(markStale));
+    QVERIFY(indexes->updateMetaData());
+    QCOMPARE(rows(), QStringList { "a.ogg|A2|NULL" });
 }
 
 QTEST_GUILESS_MAIN(tst_IndexManager)
