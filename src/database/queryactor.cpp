@@ -43,6 +43,33 @@ void QueryActor::rollback(const QSqlQuery &query, const char *function, const ch
     m_database.rollback();
 }
 
+bool QueryActor::prepareStatements(std::initializer_list<PreparedStatement> statements, const char *function)
+{
+    for (const PreparedStatement &statement : statements) {
+        statement.query->setForwardOnly(true);
+        if (!statement.query->prepare(QString::fromUtf8(statement.text))) {
+            rollback(*statement.query, function, statement.failure);
+            return false;
+        }
+    }
+    return true;
+}
+
+bool QueryActor::execBatch(QSqlQuery &query, const QList<QVariantList> &columns, const char *function,
+                           const char *failure)
+{
+    if (columns.isEmpty() || columns.first().isEmpty())
+        return true;
+    for (int i = 0; i < columns.size(); ++i)
+        query.bindValue(i, columns.at(i));
+    if (!query.execBatch()) {
+        rollback(query, function, failure);
+        return false;
+    }
+    query.finish();
+    return true;
+}
+
 void QueryActor::warn(const QSqlQuery &query, const char *function, const char *message)
 {
     qWarning().noquote() << (function ? function : "");

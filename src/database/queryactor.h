@@ -1,8 +1,12 @@
 #ifndef QUERYACTOR_H
 #define QUERYACTOR_H
 
+#include <QList>
 #include <QSqlQuery>
 #include <QString>
+#include <QVariant>
+
+#include <initializer_list>
 
 class QueryAgentDatabase;
 
@@ -21,6 +25,21 @@ public:
     bool transaction();
     bool commit();
     void rollback(const QSqlQuery &query, const char *function, const char *message);
+
+    // A member statement with the report of its failed preparation.
+    struct PreparedStatement
+    {
+        QSqlQuery *query;
+        const char *text;
+        const char *failure;
+    };
+    // Prepares forward-only, in order; the first failure rolls back with its
+    // report and stops, leaving the later statements unprepared.
+    bool prepareStatements(std::initializer_list<PreparedStatement> statements, const char *function);
+    // Binds one list per position and runs the batch, unless the first list is
+    // empty; a failure rolls back with the report.
+    bool execBatch(QSqlQuery &query, const QList<QVariantList> &columns, const char *function,
+                   const char *failure);
     static void warn(const QSqlQuery &query, const char *function, const char *message);
 
     QString threadId() const;

@@ -4,6 +4,8 @@
 #include "downloadmanager.h"
 #include "filemanager.h"
 #include "imagemanager.h"
+#include "indexmanager.h"
+#include "installmanager.h"
 #include "themeletmanager.h"
 
 ContentManager::ContentManager() = default;
@@ -54,14 +56,32 @@ ContentManager *ContentManager::managerFromType(int type)
     case ThemeletContent::Download:
         manager = new DownloadManager(DbManager::instance());
         break;
+    case 6:
+        // Its constructor creates the themelet and index managers first.
+        manager = new InstallManager(DbManager::instance(), nullptr);
+        break;
+    case 7:
+        manager = new IndexManager(DbManager::instance());
+        break;
     default:
-        // Managers of the remaining types are added with their subsystems.
         break;
     }
     // Stored only now: a constructor may create other managers, which can
     // rehash the table under a reference taken before.
     database.m_contentManagers[key] = manager;
     return manager;
+}
+
+bool ContentManager::updateFirst(QList<ContentManager *> &managers)
+{
+    if (managers.isEmpty())
+        return false;
+    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
+    ContentManager *head = managers.first();
+    if (head && head->updateMetaData())
+        return true;
+    managers.removeFirst();
+    return !managers.isEmpty();
 }
 
 QList<ContentManager *> ContentManager::scannerManagers()

@@ -21,6 +21,11 @@ public:
 
     static ContentManager *managerFromType(int type);
     static QList<ContentManager *> scannerManagers();
+
+protected:
+    // One step of a driver's list: the head runs until it reports no more,
+    // then it is dropped. False once the list is empty.
+    static bool updateFirst(QList<ContentManager *> &managers);
 };
 
 #endif

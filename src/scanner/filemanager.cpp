@@ -235,14 +235,7 @@ bool FileManager::event(QEvent *event)
 
 bool FileManager::updateMetaData()
 {
-    if (m_managers.isEmpty())
-        return false;
-    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
-    ContentManager *head = m_managers.first();
-    if (head && head->updateMetaData())
-        return true;
-    m_managers.removeFirst();
-    return !m_managers.isEmpty();
+    return updateFirst(m_managers);
 }
 
 void FileManager::scheduleUpdate()
@@ -257,21 +250,6 @@ void FileManager::postUpdate()
         return;
     m_updateQueued = true;
     QCoreApplication::postEvent(this, new QEvent(QEvent::UpdateRequest), Qt::NormalEventPriority);
-}
-
-bool FileManager::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
-                            const char *function, const char *failure)
-{
-    if (columns.first().isEmpty())
-        return true;
-    for (int i = 0; i < columns.size(); ++i)
-        query.bindValue(i, columns.at(i));
-    if (!query.execBatch()) {
-        rollback(query, function, failure);
-        return false;
-    }
-    query.finish();
-    return true;
 }
 
 qint64 FileManager::appendDirectory(const QString &path, DirectoryScope scope, Scan scan)

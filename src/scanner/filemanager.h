@@ -62,8 +62,6 @@ private:
     bool readEvent();
     bool scanDirectory();
     void postUpdate();
-    bool execBatch(QSqlQuery &query, const QList<QVariantList> &columns, const char *function,
-                   const char *failure);
 
     QSqlQuery m_fileQuery;
     QSqlQuery m_fileInsert;

@@ -4,8 +4,15 @@
 
 #include <QLocale>
 
+// Themelet catalogues of a locale are looked up without a suffix.
 ThemeletTranslator::ThemeletTranslator()
-    : m_loaded(false)
+    : ThemeletTranslator(QStringLiteral(""))
+{
+}
+
+ThemeletTranslator::ThemeletTranslator(const QString &localeSuffix)
+    : m_localeSuffix(localeSuffix)
+    , m_loaded(false)
 {
 }
 
@@ -25,9 +32,8 @@ void ThemeletTranslator::selectCatalog(const QString &catalog)
     m_catalog = catalog;
     const QString directory = catalogDirectory();
     const bool engineering = m_engineeringTranslator.load(catalog + QLatin1String("_eng_en"), directory);
-    // The locale catalogues are looked up without a suffix.
     const bool locale = m_localeTranslator.load(QLocale(), catalog, QStringLiteral("-"), directory,
-                                                QStringLiteral(""));
+                                                m_localeSuffix);
     m_loaded = engineering || locale;
 }
 

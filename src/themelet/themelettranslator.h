@@ -10,6 +10,9 @@ class ThemeletTranslator
 {
 public:
     ThemeletTranslator();
+    // `localeSuffix` ends the names of the locale catalogues; ".qm" also finds
+    // the plain catalogue in the "C" locale.
+    explicit ThemeletTranslator(const QString &localeSuffix);
 
     // Switches to the catalogue a file names; an empty name switches translation
     // off but keeps the remembered name, so that the same catalogue named again
@@ -26,6 +29,7 @@ private:
     QTranslator m_localeTranslator;
     QTranslator m_engineeringTranslator;
     QString m_catalog;
+    QString m_localeSuffix;
     bool m_loaded;
 
     Q_DISABLE_COPY(ThemeletTranslator)

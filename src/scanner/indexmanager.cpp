@@ -1,0 +1,317 @@
+#include "indexmanager.h"
+
+#include "content.h"
+#include "filemanager.h"
+#include "queryagentdatabase.h"
+#include "themelettranslator.h"
+
+#include <QDateTime>
+#include <QDebug>
+#include <QFile>
+#include <QFileInfo>
+#include <QJsonArray>
+#include <QJsonDocument>
+#include <QJsonObject>
+#include <QVector>
+
+#include <algorithm>
+
+namespace {
+
+const char *const ConstructorSignature = "IndexManager::IndexManager(QueryAgentDatabase&)";
+const char *const UpdateSignature = "virtual bool IndexManager::updateMetaData()";
+
+const char *const SelectModifiedIndex =
+        "SELECT file.id, directory.id, directory.path, file.fileName FROM file LEFT JOIN directory ON file.directoryId = directory.id WHERE file.metadataCurrent = 0 AND file.mimeType = 'application/x-vorka-index' LIMIT 1;";
+const char *const UpdateDirectoryParent = "UPDATE directory SET parentId = ? WHERE id = ?";
+
+FileManager *fileManager()
+{
+    return static_cast<FileManager *>(ContentManager::managerFromType(ThemeletContent::File));
+}
+
+}
+
+struct IndexManager::Entry
+{
+    QByteArray name;
+    QString path;
+    QString fileName;
+    QString displayName;
+    QString category;
+    QDateTime modificationTime;
+};
+
+struct IndexManager::Changes
+{
+    QVariantList deleteIds;
+
+    QVariantList updateMimeTypes;
+    QVariantList updateDisplayNames;
+    QVariantList updateCategories;
+    QVariantList updateTimes;
+    QVariantList updateIds;
+
+    QVariantList insertDirectoryIds;
+    QVariantList insertMimeTypes;
+    QVariantList insertFileNames;
+    QVariantList insertDisplayNames;
+    QVariantList insertCategories;
+    QVariantList insertTimes;
+
+    bool isEmpty() const
+    {
+        return deleteIds.isEmpty() && updateIds.isEmpty() && insertFileNames.isEmpty();
+    }
+};
+
+IndexManager::IndexManager(QueryAgentDatabase &database)
+    : QueryActor(database)
+    , m_fileQuery(database)
+    , m_fileInsert(database)
+    , m_fileUpdate(database)
+    , m_fileDelete(database)
+    , m_modifiedReset(database)
+    , m_renameQuery(database)
+{
+    // No transaction is open here: the rollback after a failure has nothing to undo.
+    prepareStatements({
+            { &m_fileQuery,
+              "SELECT id, fileName, displayName, category, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
+              "Failed to prepare m_fileQuery." },
+            { &m_fileInsert,
+              "INSERT INTO file ( directoryId, mimeType, fileName, displayName, category, modificationTime, permissions, metadataCurrent) VALUES(?, ?, ?, ?, ?, ?, 1, 0)",
+              "Failed to prepare m_fileInsert." },
+            { &m_fileUpdate,
+              "UPDATE file SET mimeType = ?, displayName = ?, category = ?, modificationTime = ?, metadataCurrent = 0 WHERE id = ?;",
+              "Failed to prepare m_fileUpdate." },
+            { &m_fileDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileDelete." },
+            { &m_modifiedReset, "UPDATE file SET metadataCurrent = 1 WHERE id = ?;",
+              "Failed to prepare m_modifiedReset." },
+            { &m_renameQuery, "UPDATE file SET fileName = ? WHERE directoryId = ? AND fileName = ?;",
+              "Failed to prepare m_renameQuery." },
+    }, ConstructorSignature);
+}
+
+IndexManager::~IndexManager() = default;
+
+bool IndexManager::updateMetaData()
+{
+    QSqlQuery selection = prepareQuery(QString::fromLatin1(SelectModifiedIndex));
+    if (!selection.exec()) {
+        warn(selection, UpdateSignature, "Failed to query modified indexes.");
+        return false;
+    }
+    if (!selection.next())
+        return false;
+
+    const QVariant fileId = selection.value(0);
+    const qint64 parentId = selection.value(1).toLongLong();
+    const QString indexPath = selection.value(2).toString() + QLatin1Char('/') + selection.value(3).toString();
+    selection.finish();
+
+    // Marked read before reading: a file that can't be read or parsed waits
+    // until it changes again instead of blocking every pass.
+    m_modifiedReset.bindValue(0, fileId);
+    if (!m_modifiedReset.exec()) {
+        warn(m_modifiedReset, UpdateSignature, "Failed to execute m_modifiedReset.");
+        return false;
+    }
+    m_modifiedReset.finish();
+
+    // Only regular files: opening a FIFO would block the whole loop.
+    QFile file(indexPath);
+    if (!QFileInfo(indexPath).isFile() || !file.open(QIODevice::ReadOnly))
+        return true;
+
+    QJsonParseError error;
+    const QJsonDocument document = QJsonDocument::fromJson(file.readAll(), &error);
+    if (document.isNull() || !document.isObject()) {
+        qWarning() << "Error parsing index from file" << file.fileName() << ", offset:" << error.offset
+                   << ", errorString:" << error.errorString();
+        return true;
+    }
+    const QJsonObject root = document.object();
+
+    FileManager *files = fileManager();
+    const QString directory = indexPath.left(indexPath.size() - 6);
+    const qint64 directoryId = files
+            ? files->appendDirectory(directory, FileManager::IndexScope, FileManager::NoScan)
+            : 0;
+    if (directoryId == 0)
+        return true;
+
+    // As a child of the index's own directory it is scanned and watched at the next start.
+    QSqlQuery parentLink = prepareQuery(QString::fromLatin1(UpdateDirectoryParent));
+    parentLink.bindValue(0, parentId);
+    parentLink.bindValue(1, directoryId);
+    if (!parentLink.exec())
+        warn(parentLink, UpdateSignature, "Failed to set directory parent ID.");
+    parentLink.finish();
+
+    // ".qm": in the "C" locale the plain catalogue is the locale's one.
+    ThemeletTranslator translator(QStringLiteral(".qm"));
+    translator.selectCatalog(root.value(QStringLiteral("translationCatalog")).toString());
+
+    QVector<Entry> entries;
+    QVector<QPair<QString, QString>> aliases;
+    const QJsonArray fileArray = root.value(QStringLiteral("files")).toArray();
+    for (const QJsonValue &value : fileArray) {
+        const QJsonObject object = value.toObject();
+        if (object.isEmpty())
+            continue;
+        const QString fileName = object.value(QStringLiteral("fileName")).toString();
+        if (fileName.isEmpty() || fileName.contains(QLatin1Char('/')))
+            continue;
+        const QString path = directory + QLatin1Char('/') + fileName;
+        const QFileInfo info(path);
+        if (!info.exists())
+            continue;
+
+        Entry entry;
+        entry.name = fileName.toUtf8();
+        entry.path = path;
+        entry.fileName = fileName;
+        entry.displayName = translator.translate(object.value(QStringLiteral("displayName")).toString());
+        entry.category = object.value(QStringLiteral("category")).toString();
+        entry.modificationTime = info.lastModified();
+
+        const QJsonArray aliasArray = object.value(QStringLiteral("aliases")).toArray();
+        for (const QJsonValue &alias : aliasArray) {
+            const QString oldName = alias.toString();
+            if (!oldName.isEmpty())
+                aliases.append(qMakePair(oldName, fileName));
+        }
+        entries.append(entry);
+    }
+
+    std::sort(entries.begin(), entries.end(), [](const Entry &a, const Entry &b) {
+        return qstrcmp(a.name, b.name) < 0;
+    });
+
+    // Renames first, in a transaction of their own, so that a renamed file is
+    // matched by the merge and keeps its id.
+    if (!aliases.isEmpty()) {
+        transaction();
+        for (const auto &alias : qAsConst(aliases)) {
+            m_renameQuery.bindValue(0, alias.second);
+            m_renameQuery.bindValue(1, directoryId);
+            m_renameQuery.bindValue(2, alias.first);
+            if (!m_renameQuery.exec()) {
+                rollback(m_renameQuery, UpdateSignature, "Failed to execute m_renameQuery.");
+                return false;
+            }
+            m_renameQuery.finish();
+        }
+        commit();
+    }
+
+    m_fileQuery.bindValue(0, directoryId);
+    if (!m_fileQuery.exec()) {
+        warn(m_fileQuery, UpdateSignature, "Failed to execute m_fileQuery");
+        return false;
+    }
+
+    Changes changes;
+    merge(entries, directoryId, &changes);
+    m_fileQuery.finish();
+
+    if (!writeChanges(changes))
+        return false;
+
+    if (!changes.isEmpty())
+        Content::signalChanged(ThemeletContent::File);
+    // Pictures listed by an index wait for ImageManager, which runs in the other loop.
+    if (files)
+        files->scheduleUpdate();
+    return true;
+}
+
+void IndexManager::merge(const QVector<Entry> &entries, qint64 directoryId, Changes *changes)
+{
+    if (entries.isEmpty()) {
+        while (m_fileQuery.next())
+            changes->deleteIds.append(m_fileQuery.value(0));
+        return;
+    }
+
+    int i = 0;
+    QString previous;
+    // Steps over duplicates and inserts entries that sort before `name`, or all
+    // remaining ones when `name` is null; false when the entries ran out.
+    const auto insertBefore = [&](const QByteArray *name) {
+        while (i < entries.size()) {
+            const Entry &entry = entries.at(i);
+            if (entry.fileName == previous) {
+                qWarning("%s", UpdateSignature);
+                qWarning() << "Duplicate fileName in .index file" << entry.fileName;
+                ++i;
+                continue;
+            }
+            if (name && qstrcmp(entry.name, *name) >= 0)
+                return true;
+            previous = entry.fileName;
+            changes->insertDirectoryIds.append(directoryId);
+            changes->insertMimeTypes.append(
+                    m_mimeDatabase.mimeTypeForFile(entry.path, QMimeDatabase::MatchDefault).name());
+            changes->insertFileNames.append(entry.fileName);
+            changes->insertDisplayNames.append(entry.displayName);
+            changes->insertCategories.append(entry.category);
+            changes->insertTimes.append(entry.modificationTime);
+            ++i;
+        }
+        return false;
+    };
+
+    while (i < entries.size() && m_fileQuery.next()) {
+        const QByteArray rowName = m_fileQuery.value(1).toString().toUtf8();
+        // A row in hand when the entries run out is neither compared nor
+        // deleted in this pass; the next pass deletes it.
+        if (!insertBefore(&rowName))
+            break;
+
+        const Entry &entry = entries.at(i);
+        if (qstrcmp(entry.name, rowName) > 0) {
+            changes->deleteIds.append(m_fileQuery.value(0));
+            continue;
+        }
+
+        previous = entry.fileName;
+        if (entry.modificationTime != m_fileQuery.value(4).toDateTime()
+                || entry.displayName != m_fileQuery.value(2).toString()
+                || entry.category != m_fileQuery.value(3).toString()) {
+            changes->updateIds.append(m_fileQuery.value(0));
+            changes->updateMimeTypes.append(
+                    m_mimeDatabase.mimeTypeForFile(entry.path, QMimeDatabase::MatchDefault).name());
+            changes->updateDisplayNames.append(entry.displayName);
+            changes->updateTimes.append(entry.modificationTime);
+            changes->updateCategories.append(entry.category);
+        }
+        ++i;
+    }
+
+    if (i >= entries.size()) {
+        while (m_fileQuery.next())
+            changes->deleteIds.append(m_fileQuery.value(0));
+    } else {
+        insertBefore(nullptr);
+    }
+}
+
+bool IndexManager::writeChanges(const Changes &changes)
+{
+    transaction();
+    if (!execBatch(m_fileDelete, { changes.deleteIds }, UpdateSignature, "Failed to execute m_fileDelete.")
+            || !execBatch(m_fileUpdate,
+                          { changes.updateMimeTypes, changes.updateDisplayNames, changes.updateCategories,
+                            changes.updateTimes, changes.updateIds },
+                          UpdateSignature, "Failed to execute m_fileUpdate.")
+            || !execBatch(m_fileInsert,
+                          { changes.insertDirectoryIds, changes.insertMimeTypes, changes.insertFileNames,
+                            changes.insertDisplayNames, changes.insertCategories, changes.insertTimes },
+                          UpdateSignature, "Failed to execute m_fileInsert.")) {
+        return false;
+    }
+    commit();
+    return true;
+}
