@@ -32,6 +32,16 @@ bool QueryActor::transaction()
     return m_database.transaction();
 }
 
+bool QueryActor::constructorTransaction(const char *function)
+{
+    if (m_database.transaction())
+        return true;
+    qWarning("%s", function);
+    qWarning("Failed to open transation on database");
+    qWarning() << m_database.lastError();
+    return false;
+}
+
 bool QueryActor::commit()
 {
     return m_database.commit();
@@ -47,8 +57,9 @@ bool QueryActor::prepareStatements(std::initializer_list<PreparedStatement> stat
 {
     for (const PreparedStatement &statement : statements) {
         statement.query->setForwardOnly(true);
-        if (!statement.query->prepare(QString::fromUtf8(statement.text))) {
-            rollback(*statement.query, function, statement.failure);
+        if (!statement.query->prepare(statement.text)) {
+            if (statement.failure)
+                rollback(*statement.query, function, statement.failure);
             return false;
         }
     }

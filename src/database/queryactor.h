@@ -23,6 +23,9 @@ public:
     QSqlQuery prepareQuery(const QString &statement);
 
     bool transaction();
+    // A constructor's transaction: on failure the report is the function, the
+    // text and the connection's error.
+    bool constructorTransaction(const char *function);
     bool commit();
     void rollback(const QSqlQuery &query, const char *function, const char *message);
 
@@ -30,11 +33,12 @@ public:
     struct PreparedStatement
     {
         QSqlQuery *query;
-        const char *text;
+        QString text;
         const char *failure;
     };
     // Prepares forward-only, in order; the first failure rolls back with its
-    // report and stops, leaving the later statements unprepared.
+    // report and stops, leaving the later statements unprepared. A statement
+    // without a failure text stops silently, with nothing rolled back.
     bool prepareStatements(std::initializer_list<PreparedStatement> statements, const char *function);
     // Binds one list per position and runs the batch, unless the first list is
     // empty; a failure rolls back with the report.

@@ -19,10 +19,7 @@ DownloadManager::DownloadManager(QueryAgentDatabase &database)
     , m_insertDownload(database)
     , m_deleteDownload(database)
 {
-    if (!transaction()) {
-        qWarning() << ConstructorSignature;
-        qWarning() << "Failed to open transation on database";
-        qWarning() << database.lastError();
+    if (!constructorTransaction(ConstructorSignature)) {
         commit();
         return;
     }

@@ -45,13 +45,6 @@ const uint32_t LeftMask = IN_MOVED_FROM | IN_DELETE | IN_DELETE_SELF;  // 0x640
 
 const int StackBufferSize = 4096;
 
-struct Statement
-{
-    QSqlQuery FileManager::*query;
-    const char *text;
-    const char *failure; // null: fail without a report
-};
-
 // One entry of a directory listing, keyed by its name in UTF-8.
 struct DiskEntry
 {
@@ -133,61 +126,28 @@ FileManager::FileManager(QueryAgentDatabase &database, QObject *parent)
         return;
     }
 
-    if (!transaction()) {
-        qWarning("%s", ConstructorSignature);
-        qWarning("Failed to open transation on database");
-        qWarning() << database.lastError();
+    if (!constructorTransaction(ConstructorSignature))
         return;
-    }
 
-    const QByteArray directoryInsert =
-            QStringLiteral("INSERT INTO directory ( parentId, path, scope) VALUES (?, ?, %1);")
-                    .arg(int(UserScope))
-                    .toUtf8();
-    const Statement statements[] = {
-        { &FileManager::m_fileQuery,
-          "SELECT id, fileName, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;",
-          "Failed to prepare m_fileQuery." },
-        { &FileManager::m_fileInsert,
-          "INSERT INTO file ( directoryId, mimeType, fileName, modificationTime, permissions, metadataCurrent) VALUES (?, ?, ?, ?, 3, 0);",
-          "Failed to prepare m_fileInsert." },
-        { &FileManager::m_fileSyncUpdate,
-          "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE id = ?;",
-          "Failed to prepare m_fileSyncUpdate." },
-        { &FileManager::m_fileSyncDelete, "DELETE FROM file WHERE id = ?;",
-          "Failed to prepare m_fileSyncDelete." },
-        { &FileManager::m_fileMonitorUpdate,
-          "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE directoryId = ? AND fileName = ?;",
-          "Failed to prepare m_fileMonitorUpdate." },
-        { &FileManager::m_fileMonitorDelete, "DELETE FROM file WHERE directoryId = ? AND fileName = ?;",
-          "Failed to prepare m_fileMonitorDelete." },
-        { &FileManager::m_directoryQuery,
-          "SELECT id, path FROM directory WHERE parentId = ? ORDER BY path ASC;",
-          "Failed to prepare m_directoryQuery." },
-        { &FileManager::m_directoryInsert, directoryInsert.constData(),
-          "Failed to prepare m_directoryInsert." },
-        { &FileManager::m_directoryDelete, "DELETE FROM directory WHERE id = ?;",
-          "Failed to prepare m_directoryDelete." },
-        { &FileManager::m_directoryIdQuery, "SELECT id, scope FROM directory WHERE path = ?;",
-          "Failed to prepare m_directoryIdQuery." },
-        { &FileManager::m_fileIdQuery, "SELECT id FROM file WHERE directoryId = ? AND fileName = ?;",
-          "Failed to prepare m_fileIdQuery." },
-        { &FileManager::m_directoryAppend, "INSERT INTO directory ( path, scope) VALUES(?, ?);",
-          "Failed to prepare m_directoryAppend." },
-        // Its failure has always been silent and leaves the transaction open.
-        { &FileManager::m_directoryScopeUpdate, "UPDATE directory SET scope = ? WHERE id = ?;", nullptr },
-        { &FileManager::m_directoryParentUpdate, "UPDATE directory SET parentId = ? WHERE id = ?;",
-          "Failed to prepare m_directoryParentUpdate." },
-    };
-    for (const Statement &statement : statements) {
-        QSqlQuery &query = this->*statement.query;
-        query.setForwardOnly(true);
-        if (!query.prepare(QString::fromUtf8(statement.text))) {
-            if (statement.failure)
-                rollback(query, ConstructorSignature, statement.failure);
-            return;
-        }
-    }
+    const bool prepared = prepareStatements({
+            { &m_fileQuery, "SELECT id, fileName, modificationTime FROM file WHERE directoryId = ? ORDER BY fileName ASC;", "Failed to prepare m_fileQuery." },
+            { &m_fileInsert, "INSERT INTO file ( directoryId, mimeType, fileName, modificationTime, permissions, metadataCurrent) VALUES (?, ?, ?, ?, 3, 0);", "Failed to prepare m_fileInsert." },
+            { &m_fileSyncUpdate, "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE id = ?;", "Failed to prepare m_fileSyncUpdate." },
+            { &m_fileSyncDelete, "DELETE FROM file WHERE id = ?;", "Failed to prepare m_fileSyncDelete." },
+            { &m_fileMonitorUpdate, "UPDATE file SET modificationTime = ?, metadataCurrent = 0 WHERE directoryId = ? AND fileName = ?;", "Failed to prepare m_fileMonitorUpdate." },
+            { &m_fileMonitorDelete, "DELETE FROM file WHERE directoryId = ? AND fileName = ?;", "Failed to prepare m_fileMonitorDelete." },
+            { &m_directoryQuery, "SELECT id, path FROM directory WHERE parentId = ? ORDER BY path ASC;", "Failed to prepare m_directoryQuery." },
+            { &m_directoryInsert, QStringLiteral("INSERT INTO directory ( parentId, path, scope) VALUES (?, ?, %1);").arg(int(UserScope)), "Failed to prepare m_directoryInsert." },
+            { &m_directoryDelete, "DELETE FROM directory WHERE id = ?;", "Failed to prepare m_directoryDelete." },
+            { &m_directoryIdQuery, "SELECT id, scope FROM directory WHERE path = ?;", "Failed to prepare m_directoryIdQuery." },
+            { &m_fileIdQuery, "SELECT id FROM file WHERE directoryId = ? AND fileName = ?;", "Failed to prepare m_fileIdQuery." },
+            { &m_directoryAppend, "INSERT INTO directory ( path, scope) VALUES(?, ?);", "Failed to prepare m_directoryAppend." },
+            // Its failure has always been silent and leaves the transaction open.
+            { &m_directoryScopeUpdate, "UPDATE directory SET scope = ? WHERE id = ?;", nullptr },
+            { &m_directoryParentUpdate, "UPDATE directory SET parentId = ? WHERE id = ?;", "Failed to prepare m_directoryParentUpdate." },
+        }, ConstructorSignature);
+    if (!prepared)
+        return;
 
     commit();
     m_initialized = true;

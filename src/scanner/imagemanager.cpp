@@ -29,10 +29,7 @@ ImageManager::ImageManager(QueryAgentDatabase &database)
     , m_modifiedQuery(database)
     , m_modifiedReset(database)
 {
-    if (!transaction()) {
-        qWarning() << ConstructorSignature;
-        qWarning() << "Failed to open transation on database";
-        qWarning() << database.lastError();
+    if (!constructorTransaction(ConstructorSignature)) {
         commit();
         return;
     }

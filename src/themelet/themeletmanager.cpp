@@ -164,44 +164,34 @@ ThemeletManager::~ThemeletManager() = default;
 
 bool ThemeletManager::prepareStatements()
 {
-    const struct {
-        QSqlQuery *query;
-        const QString &statement;
-        const char *failure;
-    } statements[] = {
-        { &m_queryThemelet, s_queryThemelet, "Failed to prepare m_queryThemelet." },
-        { &m_queryThemeletByZefId, s_queryThemeletByZefId, "Failed to prepare m_queryThemeletByZefId." },
-        { &m_insertThemelet, s_insertThemelet, "Failed to prepare m_insertThemelet." },
-        { &m_updateFile, s_updateFile, "Failed to prepare m_updateFile." },
-        { &m_updateThemelet, s_updateThemelet, "Failed to prepare m_updateThemelet." },
-        { &m_deleteThemelet, s_deleteThemelet, "Failed to prepare m_deleteThemelet." },
-        { &m_queryResource, s_queryResource, "Failed to prepare m_queryResource." },
-        { &m_insertResource, s_insertResource, "Failed to prepare m_insertResource." },
-        { &m_deleteResource, s_deleteResource, "Failed to prepare m_deleteResource." },
-        { &m_clearResources, s_clearResources, "Failed to prepare m_clearResources." },
-        { nullptr, s_modifiedView, "Failed to execute query." },
-        { &m_modifiedQuery, s_modifiedQuery, "Failed to prepare m_modifiedQuery." },
-        { &m_modifiedThemeletQuery, s_modifiedThemeletQuery, "Failed to prepare m_modifiedThemeletQuery." },
-        { &m_modifiedResourceQuery, s_modifiedResourceQuery, "Failed to prepare m_modifiedResourceQuery." },
-        { &m_modifiedReset, s_modifiedReset, "Failed to prepare m_modifiedReset." },
-    };
+    const bool prepared = QueryActor::prepareStatements({
+            { &m_queryThemelet, s_queryThemelet, "Failed to prepare m_queryThemelet." },
+            { &m_queryThemeletByZefId, s_queryThemeletByZefId, "Failed to prepare m_queryThemeletByZefId." },
+            { &m_insertThemelet, s_insertThemelet, "Failed to prepare m_insertThemelet." },
+            { &m_updateFile, s_updateFile, "Failed to prepare m_updateFile." },
+            { &m_updateThemelet, s_updateThemelet, "Failed to prepare m_updateThemelet." },
+            { &m_deleteThemelet, s_deleteThemelet, "Failed to prepare m_deleteThemelet." },
+            { &m_queryResource, s_queryResource, "Failed to prepare m_queryResource." },
+            { &m_insertResource, s_insertResource, "Failed to prepare m_insertResource." },
+            { &m_deleteResource, s_deleteResource, "Failed to prepare m_deleteResource." },
+            { &m_clearResources, s_clearResources, "Failed to prepare m_clearResources." },
+        }, s_constructorFunction);
+    if (!prepared)
+        return false;
 
-    for (const auto &entry : statements) {
-        if (!entry.query) {
-            QSqlQuery view(m_database);
-            if (!view.exec(entry.statement)) {
-                rollback(view, s_constructorFunction, entry.failure);
-                return false;
-            }
-            continue;
-        }
-        entry.query->setForwardOnly(true);
-        if (!entry.query->prepare(entry.statement)) {
-            rollback(*entry.query, s_constructorFunction, entry.failure);
-            return false;
-        }
+    // The statements after it read the view.
+    QSqlQuery view(m_database);
+    if (!view.exec(s_modifiedView)) {
+        rollback(view, s_constructorFunction, "Failed to execute query.");
+        return false;
     }
-    return true;
+
+    return QueryActor::prepareStatements({
+            { &m_modifiedQuery, s_modifiedQuery, "Failed to prepare m_modifiedQuery." },
+            { &m_modifiedThemeletQuery, s_modifiedThemeletQuery, "Failed to prepare m_modifiedThemeletQuery." },
+            { &m_modifiedResourceQuery, s_modifiedResourceQuery, "Failed to prepare m_modifiedResourceQuery." },
+            { &m_modifiedReset, s_modifiedReset, "Failed to prepare m_modifiedReset." },
+        }, s_constructorFunction);
 }
 
 FileManager *ThemeletManager::fileManager() const
