@@ -36,13 +36,15 @@ protected:
                  QStringLiteral("^QSqlError\\("), "^\"" + QRegularExpression::escape(statement) };
     }
 
-    // The warnings are exactly these, in this order.
+    // The warnings match these patterns, in this order, and there are no others.
     static void compareWarnings(const MessageLog &log, const QStringList &patterns)
     {
-        const QStringList warnings = log.warnings();
-        QCOMPARE(warnings.size(), patterns.size());
-        for (int i = 0; i < patterns.size(); ++i)
-            QVERIFY2(QRegularExpression(patterns.at(i)).match(warnings.at(i)).hasMatch(), qPrintable(warnings.at(i) + " !~ " + patterns.at(i)));
+        QStringList warnings = log.warnings();
+        for (int i = 0; i < qMin(warnings.size(), patterns.size()); ++i) {
+            if (QRegularExpression(patterns.at(i)).match(warnings.at(i)).hasMatch())
+                warnings[i] = patterns.at(i);
+        }
+        QCOMPARE(warnings, patterns);
     }
 
     // A 64x48 JPEG; tags are exiv2 modify commands.
