@@ -173,7 +173,8 @@ void tst_FileManager::scanAndEvents()
     if (c.changes.startsWith('?')) // a watch of someone else's on the manager's descriptor
         QVERIFY(inotify_add_watch(int(manager.socket()), qPrintable(root + "/.."), IN_CREATE) >= 0);
     run(root, c.changes.mid(c.changes.startsWith('?') ? 1 : 0));
-    QVERIFY(!c.changes.contains("seq") || pendingBytes(manager) > 4096);
+    if (c.changes.contains("seq")) // more than the stack buffer holds
+        QVERIFY(pendingBytes(manager) > 4096);
     QVERIFY(settle(manager));
 
     compareWarnings(log, c.warnings);
