@@ -2,10 +2,12 @@
 #define MANAGERTESTCASE_H
 
 #include "dbmanager.h"
+#include "messagelog.h"
 #include "signalrecorder.h"
 #include "testdatabase.h"
 
-#include <QFile>
+#include <QImage>
+#include <QProcess>
 #include <QRegularExpression>
 #include <QTest>
 
@@ -18,7 +20,8 @@ class ManagerTestCase
 protected:
     void openFreshIndex()
     {
-        closeIndex();
+        m_sql.reset();
+        m_db.reset();
         for (const char *suffix : { "", "-wal", "-shm" })
             QFile::remove(TestDatabase::indexPath() + QLatin1String(suffix));
         m_db.reset(new DbManager);
@@ -26,19 +29,33 @@ protected:
         SignalRecorder::clear();
     }
 
-    void closeIndex()
+    // The records of a failed statement, as patterns: function, message, error, statement.
+    static QStringList failure(const char *function, const char *message, const QString &statement)
     {
-        m_sql.reset();
-        m_db.reset();
+        return { '^' + QRegularExpression::escape(function) + '$', '^' + QRegularExpression::escape(message) + '$',
+                 QStringLiteral("^QSqlError\\("), "^\"" + QRegularExpression::escape(statement) };
     }
 
-    // The four records of QueryActor::warn and QueryActor::rollback.
-    static void expectQueryWarning(const char *function, const char *message, const QString &statement)
+    // The warnings match these patterns, in this order, and there are no others.
+    static void compareWarnings(const MessageLog &log, const QStringList &patterns)
     {
-        QTest::ignoreMessage(QtWarningMsg, function);
-        QTest::ignoreMessage(QtWarningMsg, message);
-        QTest::ignoreMessage(QtWarningMsg, QRegularExpression(QStringLiteral("^QSqlError\\(")));
-        QTest::ignoreMessage(QtWarningMsg, qPrintable(QLatin1Char('"') + statement + QLatin1Char('"')));
+        QStringList warnings = log.warnings();
+        for (int i = 0; i < qMin(warnings.size(), patterns.size()); ++i) {
+            if (QRegularExpression(patterns.at(i)).match(warnings.at(i)).hasMatch())
+                warnings[i] = patterns.at(i);
+        }
+        QCOMPARE(warnings, patterns);
+    }
+
+    // A 64x48 JPEG; tags are exiv2 modify commands.
+    static bool writeJpeg(const QString &path, const QStringList &tags = {})
+    {
+        QImage image(64, 48, QImage::Format_RGB32);
+        image.fill(Qt::darkCyan);
+        QStringList arguments;
+        for (const QString &tag : tags)
+            arguments << QStringLiteral("-M") << tag;
+        return image.save(path, "JPG") && (tags.isEmpty() || QProcess::execute("exiv2", arguments << path) == 0);
     }
 
     std::unique_ptr<DbManager> m_db;

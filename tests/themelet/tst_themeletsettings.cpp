@@ -1,4 +1,4 @@
-#include "../platform/dconftest.h"
+#include "dconftest.h"
 #include "themeletsettings.h"
 
 #include <QSignalSpy>
