@@ -3,6 +3,7 @@
 
 #include <QMutex>
 #include <QStringList>
+#include <QTest>
 #include <QtGlobal>
 
 // Collects the records written while it lives, from any thread, in order.
@@ -18,6 +19,11 @@ public:
         s_forward = forward;
         s_previous = qInstallMessageHandler(handler);
     }
+    // Expects `expected`, records as records() gives them: each is handed to
+    // QTest::ignoreMessage, so that one that doesn't come fails the test.
+    explicit MessageLog(const QStringList &expected) : MessageLog(true) { expect(expected); }
+    // {"text"} would otherwise pick the bool constructor.
+    MessageLog(const char *) = delete;
     ~MessageLog()
     {
         qInstallMessageHandler(s_previous);
@@ -41,6 +47,26 @@ public:
             if (record.startsWith(prefix))
                 result << record.mid(prefix.size());
         }
+        return result;
+    }
+
+    static void expect(const QStringList &records)
+    {
+        for (const QString &record : records) {
+            const int colon = record.indexOf(QLatin1String(": "));
+            const QString level = record.left(colon);
+            const QtMsgType type = level == QLatin1String("debug") ? QtDebugMsg
+                    : level == QLatin1String("critical") ? QtCriticalMsg : QtWarningMsg;
+            QTest::ignoreMessage(type, qPrintable(record.mid(colon + 2)));
+        }
+    }
+
+    // Texts as the records of warnings.
+    static QStringList warningRecords(const QStringList &texts)
+    {
+        QStringList result;
+        for (const QString &text : texts)
+            result << QLatin1String("warning: ") + text;
         return result;
     }
 

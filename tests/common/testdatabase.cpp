@@ -15,6 +15,12 @@ QString TestDatabase::indexPath()
     return QueryAgent::databaseUrl(0).toLocalFile();
 }
 
+QString TestDatabase::errorText(const char *code, const char *text, const char *driverText)
+{
+    return QStringLiteral("QSqlError(\"%1\", \"%2\", \"%3\")")
+            .arg(QLatin1String(code), QLatin1String(driverText), QLatin1String(text));
+}
+
 TestDatabase::TestDatabase(const QString &path)
     : m_name(QUuid::createUuid().toString())
 {

@@ -13,6 +13,10 @@ public:
     // The index file of the sandbox, as QueryAgent::databaseUrl(0) names it.
     static QString indexPath();
 
+    // A QSqlError in its debug form, as log records show it.
+    static QString errorText(const char *code, const char *text,
+                             const char *driverText = "Unable to execute statement");
+
     explicit TestDatabase(const QString &path = indexPath());
     ~TestDatabase();
 
