@@ -73,6 +73,11 @@ bool QueryActor::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
         return true;
     for (int i = 0; i < columns.size(); ++i)
         query.bindValue(i, columns.at(i));
+    return execBatch(query, function, failure);
+}
+
+bool QueryActor::execBatch(QSqlQuery &query, const char *function, const char *failure)
+{
     if (!query.execBatch()) {
         rollback(query, function, failure);
         return false;

@@ -44,6 +44,8 @@ public:
     // empty; a failure rolls back with the report.
     bool execBatch(QSqlQuery &query, const QList<QVariantList> &columns, const char *function,
                    const char *failure);
+    // The same for a statement whose lists are bound already.
+    bool execBatch(QSqlQuery &query, const char *function, const char *failure);
     static void warn(const QSqlQuery &query, const char *function, const char *message);
 
     QString threadId() const;

@@ -326,56 +326,29 @@ bool ThemeletManager::updateMetaData()
     transaction();
 
     batch.bindRead(m_modifiedReset);
-    if (!m_modifiedReset.execBatch()) {
-        rollback(m_modifiedReset, s_updateFunction, "Failed to execute m_modifiedReset.");
+    if (!execBatch(m_modifiedReset, s_updateFunction, "Failed to execute m_modifiedReset."))
         return false;
-    }
-    m_modifiedReset.finish();
-
     if (batch.hasDeleted()) {
         batch.bindDeleted(m_deleteThemelet);
-        if (!m_deleteThemelet.execBatch()) {
-            rollback(m_deleteThemelet, s_updateFunction, "Failed to execute m_deleteThemelet.");
+        if (!execBatch(m_deleteThemelet, s_updateFunction, "Failed to execute m_deleteThemelet."))
             return false;
-        }
-        m_deleteThemelet.finish();
     }
-
     if (batch.hasInserts()) {
         batch.bindInserts(m_insertThemelet);
-        if (!m_insertThemelet.execBatch()) {
-            rollback(m_insertThemelet, s_updateFunction, "Failed to execute m_insertThemelet.");
+        if (!execBatch(m_insertThemelet, s_updateFunction, "Failed to execute m_insertThemelet."))
             return false;
-        }
-        m_insertThemelet.finish();
     }
-
     if (batch.hasUpdates()) {
         batch.bindUpdates(m_updateFile, m_updateThemelet, m_clearResources);
-        if (!m_updateFile.execBatch()) {
-            rollback(m_updateFile, s_updateFunction, "Failed to execute m_updateFile.");
+        if (!execBatch(m_updateFile, s_updateFunction, "Failed to execute m_updateFile.")
+            || !execBatch(m_updateThemelet, s_updateFunction, "Failed to execute m_updateThemelet.")
+            || !execBatch(m_clearResources, s_updateFunction, "Failed to execute m_clearResources."))
             return false;
-        }
-        m_updateFile.finish();
-        if (!m_updateThemelet.execBatch()) {
-            rollback(m_updateThemelet, s_updateFunction, "Failed to execute m_updateThemelet.");
-            return false;
-        }
-        m_updateThemelet.finish();
-        if (!m_clearResources.execBatch()) {
-            rollback(m_clearResources, s_updateFunction, "Failed to execute m_clearResources.");
-            return false;
-        }
-        m_clearResources.finish();
     }
-
     if (batch.hasResources()) {
         batch.bindResources(m_insertResource);
-        if (!m_insertResource.execBatch()) {
-            rollback(m_insertResource, s_updateFunction, "Failed to execute m_insertResource.");
+        if (!execBatch(m_insertResource, s_updateFunction, "Failed to execute m_insertResource."))
             return false;
-        }
-        m_insertResource.finish();
     }
 
     commit();
@@ -588,25 +561,11 @@ bool ThemeletManager::save(qint64 id, const QVariantMap &values)
         return false;
     }
     m_updateThemelet.finish();
-    if (!deleteIds.isEmpty()) {
-        m_deleteResource.bindValue(0, deleteIds);
-        m_deleteResource.bindValue(1, deleteTypes);
-        if (!m_deleteResource.execBatch()) {
-            rollback(m_deleteResource, s_saveFunction, "Failed to execute m_deleteResource.");
-            return false;
-        }
-        m_deleteResource.finish();
-    }
-    if (!insertIds.isEmpty()) {
-        m_insertResource.bindValue(0, insertIds);
-        m_insertResource.bindValue(1, insertTypes);
-        m_insertResource.bindValue(2, insertResourceIds);
-        if (!m_insertResource.execBatch()) {
-            rollback(m_insertResource, s_saveFunction, "Failed to execute m_insertResource.");
-            return false;
-        }
-        m_insertResource.finish();
-    }
+    if (!execBatch(m_deleteResource, { deleteIds, deleteTypes }, s_saveFunction,
+                   "Failed to execute m_deleteResource.")
+        || !execBatch(m_insertResource, { insertIds, insertTypes, insertResourceIds }, s_saveFunction,
+                      "Failed to execute m_insertResource."))
+        return false;
     commit();
 
     if (!m_activeThemelet.isNull() && m_activeThemelet->id == id) {
