@@ -5,96 +5,48 @@
 
 #include <QDebug>
 #include <QGlobalStatic>
-#include <QUrl>
 
 Q_GLOBAL_STATIC(DConfStore, s_store)
 
 namespace {
 
-GVariant *toGVariant(const QVariant &value);
-
-GVariant *stringListToGVariant(const QStringList &list)
-{
-    GVariantBuilder builder;
-    g_variant_builder_init(&builder, G_VARIANT_TYPE_STRING_ARRAY);
-    for (const QString &item : list)
-        g_variant_builder_add(&builder, "s", item.toUtf8().constData());
-    return g_variant_builder_end(&builder);
-}
-
-GVariant *listToGVariant(const QVariantList &list)
-{
-    bool allStrings = true;
-    for (const QVariant &item : list)
-        allStrings = allStrings && item.userType() == QMetaType::QString;
-    if (allStrings) {
-        QStringList strings;
-        for (const QVariant &item : list)
-            strings.append(item.toString());
-        return stringListToGVariant(strings);
-    }
-
-    GVariantBuilder builder;
-    g_variant_builder_init(&builder, G_VARIANT_TYPE("av"));
-    for (const QVariant &item : list) {
-        GVariant *element = toGVariant(item);
-        if (!element) {
-            g_variant_builder_clear(&builder);
-            return nullptr;
-        }
-        g_variant_builder_add(&builder, "v", element);
-    }
-    return g_variant_builder_end(&builder);
-}
-
-// A floating reference, or null for a value the store can't hold.
+// A floating reference, or null for a value the store can't hold. Other
+// types go as their text, when they have one.
 GVariant *toGVariant(const QVariant &value)
 {
     switch (value.userType()) {
     case QMetaType::Bool:
         return g_variant_new_boolean(value.toBool());
     case QMetaType::Int:
-    case QMetaType::Short:
-    case QMetaType::UShort:
-    case QMetaType::Char:
-    case QMetaType::SChar:
-    case QMetaType::UChar:
         return g_variant_new_int32(value.toInt());
     case QMetaType::UInt:
         return g_variant_new_uint32(value.toUInt());
-    case QMetaType::Long:
     case QMetaType::LongLong:
         return g_variant_new_int64(value.toLongLong());
-    case QMetaType::ULong:
     case QMetaType::ULongLong:
         return g_variant_new_uint64(value.toULongLong());
-    case QMetaType::Float:
     case QMetaType::Double:
         return g_variant_new_double(value.toDouble());
-    case QMetaType::QString:
-        return g_variant_new_string(value.toString().toUtf8().constData());
-    case QMetaType::QByteArray:
-        // Replaces bytes that aren't UTF-8: a GVariant string must be valid.
-        return g_variant_new_string(QString::fromUtf8(value.toByteArray()).toUtf8().constData());
-    case QMetaType::QUrl:
-        return g_variant_new_string(value.toUrl().toString().toUtf8().constData());
-    case QMetaType::QStringList:
-        return stringListToGVariant(value.toStringList());
-    case QMetaType::QVariantList:
-        return listToGVariant(value.toList());
+    case QMetaType::QStringList: {
+        GVariantBuilder builder;
+        g_variant_builder_init(&builder, G_VARIANT_TYPE_STRING_ARRAY);
+        for (const QString &item : value.toStringList())
+            g_variant_builder_add(&builder, "s", item.toUtf8().constData());
+        return g_variant_builder_end(&builder);
+    }
     default:
         break;
     }
     QVariant text = value;
-    if (value.isValid() && text.convert(QMetaType::QString))
+    if (text.convert(QMetaType::QString))
         return g_variant_new_string(text.toString().toUtf8().constData());
     return nullptr;
 }
 
+// Invalid for a type that has no plain QVariant form, such as a tuple.
 QVariant fromGVariant(GVariant *value)
 {
-    const GVariantClass kind = g_variant_classify(value);
-    switch (kind) {
+    switch (g_variant_classify(value)) {
     case G_VARIANT_CLASS_BOOLEAN:
         return bool(g_variant_get_boolean(value));
     case G_VARIANT_CLASS_BYTE:
@@ -111,8 +63,6 @@ QVariant fromGVariant(GVariant *value)
         return qlonglong(g_variant_get_int64(value));
     case G_VARIANT_CLASS_UINT64:
         return qulonglong(g_variant_get_uint64(value));
-    case G_VARIANT_CLASS_HANDLE:
-        return int(g_variant_get_handle(value));
     case G_VARIANT_CLASS_DOUBLE:
         return g_variant_get_double(value);
     case G_VARIANT_CLASS_STRING:
@@ -127,30 +77,15 @@ QVariant fromGVariant(GVariant *value)
     }
     case G_VARIANT_CLASS_ARRAY:
         if (g_variant_is_of_type(value, G_VARIANT_TYPE_STRING_ARRAY)) {
+            gsize count = 0;
+            const gchar **items = g_variant_get_strv(value, &count);
             QStringList list;
-            const gsize count = g_variant_n_children(value);
-            for (gsize i = 0; i < count; ++i) {
-                const gchar *item = nullptr;
-                g_variant_get_child(value, i, "&s", &item);
-                list.append(QString::fromUtf8(item));
-            }
+            for (gsize i = 0; i < count; ++i)
+                list.append(QString::fromUtf8(items[i]));
+            g_free(items);
             return list;
         }
-        if (g_variant_is_of_type(value, G_VARIANT_TYPE_BYTESTRING)) {
-            return QByteArray(static_cast<const char *>(g_variant_get_data(value)),
-                              int(g_variant_get_size(value)));
-        }
-        Q_FALLTHROUGH();
-    case G_VARIANT_CLASS_TUPLE: {
-        QVariantList list;
-        const gsize count = g_variant_n_children(value);
-        for (gsize i = 0; i < count; ++i) {
-            GVariant *child = g_variant_get_child_value(value, i);
-            list.append(fromGVariant(child));
-            g_variant_unref(child);
-        }
-        return list;
-    }
+        break;
     default:
         break;
     }

@@ -33,19 +33,8 @@ QVariant MGConfItem::value() const
     return store ? store->read(m_key) : QVariant();
 }
 
-QVariant MGConfItem::value(const QVariant &def) const
-{
-    const QVariant current = value();
-    return current.isValid() ? current : def;
-}
-
 void MGConfItem::set(const QVariant &val)
 {
     if (DConfStore *store = DConfStore::instance())
         store->write(m_key, val);
-}
-
-void MGConfItem::unset()
-{
-    set(QVariant());
 }

@@ -13,8 +13,6 @@
 class MGConfItem : public QObject
 {
     Q_OBJECT
-    Q_PROPERTY(QString key READ key CONSTANT)
-    Q_PROPERTY(QVariant value READ value WRITE set NOTIFY valueChanged)
 public:
     explicit MGConfItem(const QString &key, QObject *parent = nullptr);
     ~MGConfItem() override;
@@ -22,12 +20,10 @@ public:
     QString key() const;
     // Invalid when the key is unset.
     QVariant value() const;
-    QVariant value(const QVariant &def) const;
 
     // An invalid value unsets the key. The store has the value on return;
     // valueChanged() follows later.
     void set(const QVariant &val);
-    void unset();
 
 signals:
     void valueChanged();

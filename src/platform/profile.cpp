@@ -49,20 +49,9 @@ int profile_set_value(const char *profile, const char *key, const char *value)
 int profile_get_value_as_int(const char *profile, const char *key)
 {
     const QVariant value = ProfileStore::value(fromUtf8(profile), fromUtf8(key));
-    switch (value.userType()) {
-    case QMetaType::UnknownType:
-        return 0;
-    case QMetaType::Bool:
+    if (value.userType() == QMetaType::Bool)
         return value.toBool() ? 1 : 0;
-    case QMetaType::Int:
-    case QMetaType::UInt:
-    case QMetaType::LongLong:
-    case QMetaType::ULongLong:
-    case QMetaType::Double:
-        return int(qBound<qlonglong>(INT_MIN, qlonglong(value.toDouble()), INT_MAX));
-    default:
-        return leadingInt(ProfileStore::text(value));
-    }
+    return leadingInt(ProfileStore::text(value));
 }
 
 int profile_set_value_as_int(const char *profile, const char *key, int value)

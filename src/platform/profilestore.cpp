@@ -4,7 +4,6 @@
 #include "profiledefaults.h"
 
 #include <QDebug>
-#include <QSet>
 
 namespace ProfileStore {
 
@@ -35,17 +34,10 @@ QStringList storedNames(const QString &dir, bool directories)
     return names;
 }
 
-QStringList unique(const QStringList &names)
+QStringList unique(QStringList names)
 {
-    QStringList result;
-    QSet<QString> seen;
-    for (const QString &name : names) {
-        if (!seen.contains(name)) {
-            seen.insert(name);
-            result.append(name);
-        }
-    }
-    return result;
+    names.removeDuplicates();
+    return names;
 }
 
 }

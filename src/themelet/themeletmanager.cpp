@@ -18,6 +18,7 @@
 #include <QStandardPaths>
 
 #include <cstdlib>
+#include <initializer_list>
 
 namespace {
 
@@ -122,6 +123,13 @@ QStringList readFallbackTones()
         free(value);
     }
     return tones;
+}
+
+void bindValues(QSqlQuery &query, std::initializer_list<QVariant> values)
+{
+    int position = 0;
+    for (const QVariant &value : values)
+        query.bindValue(position++, value);
 }
 
 // A value of save()'s map, or the row's when the map has none.
@@ -384,16 +392,13 @@ qint64 ThemeletManager::create(const Themelet &themelet)
         m_queryThemelet.finish();
         m_updateFile.bindValue(0, themelet->displayName);
         m_updateFile.bindValue(1, id);
-        const QVariant values[] = {
+        bindValues(m_insertThemelet, {
             id, themelet->homeWallpaper, themelet->applicationWallpaper,
             colorToString(themelet->highlightColor), colorToString(themelet->secondaryHighlightColor),
             colorToString(themelet->primaryColor), colorToString(themelet->secondaryColor),
             themelet->ringerVolume, themelet->enabledSounds, themelet->favorite,
             themelet->partnerSpace, themelet->version
-        };
-        int position = 0;
-        for (const QVariant &value : values)
-            m_insertThemelet.bindValue(position++, value);
+        });
 
         if (!m_updateFile.exec()) {
             warn(m_updateFile, s_createFunction, "Failed to execute m_updateFile.");
@@ -410,16 +415,13 @@ qint64 ThemeletManager::create(const Themelet &themelet)
     }
 
     // The row exists: the user's favourite mark and its date survive.
-    const QVariant values[] = {
+    bindValues(m_updateThemelet, {
         m_queryThemelet.value(FavoriteColumn), m_queryThemelet.value(TimestampColumn),
         themelet->homeWallpaper, themelet->applicationWallpaper,
         colorToString(themelet->highlightColor), colorToString(themelet->secondaryHighlightColor),
         colorToString(themelet->primaryColor), colorToString(themelet->secondaryColor),
         themelet->ringerVolume, themelet->enabledSounds, themelet->partnerSpace, themelet->version, id
-    };
-    int position = 0;
-    for (const QVariant &value : values)
-        m_updateThemelet.bindValue(position++, value);
+    });
 
     QSqlQuery renameFile = prepareQuery(s_renameFile);
     QString fileName = m_queryThemelet.value(FileNameColumn).toString();
@@ -502,7 +504,7 @@ bool ThemeletManager::save(qint64 id, const QVariantMap &values)
         enabledSounds = enabled.toBool() ? (enabledSounds | (1 << i)) : (enabledSounds & ~(1 << i));
     }
 
-    const QVariant row[] = {
+    bindValues(m_updateThemelet, {
         valueOr(values, QStringLiteral("favorite"), wasFavorite),
         timestamp,
         m_queryThemelet.value(HomeWallpaperColumn),
@@ -517,10 +519,7 @@ bool ThemeletManager::save(qint64 id, const QVariantMap &values)
         m_queryThemelet.value(PartnerSpaceColumn),
         m_queryThemelet.value(VersionColumn),
         id
-    };
-    int position = 0;
-    for (const QVariant &value : row)
-        m_updateThemelet.bindValue(position++, value);
+    });
     m_queryThemelet.finish();
 
     // Tone files are registered before the transaction; their rows stay if it fails.
@@ -579,12 +578,11 @@ bool ThemeletManager::remove(qint64 id)
 {
     const Content content = m_agent.queryById(id);
     if (content.isValid() && content.type() == ThemeletContent::Themelet) {
-        // The pictures go whoever owns them; the file row and the tones stay.
+        // The pictures go whoever owns them, an empty path failing harmlessly;
+        // the file row and the tones stay.
         const Themelet themelet(content);
-        for (const QString &wallpaper : { themelet->homeWallpaper, themelet->applicationWallpaper }) {
-            if (!wallpaper.isEmpty())
-                QFile::remove(wallpaper);
-        }
+        QFile::remove(themelet->homeWallpaper);
+        QFile::remove(themelet->applicationWallpaper);
     }
 
     m_deleteThemelet.bindValue(0, id);

@@ -16,11 +16,6 @@ ThemeletTranslator::ThemeletTranslator(const QString &localeSuffix)
 {
 }
 
-QString ThemeletTranslator::catalogDirectory()
-{
-    return Sysroot::path(QStringLiteral("/usr/share/translations/"));
-}
-
 void ThemeletTranslator::selectCatalog(const QString &catalog)
 {
     if (catalog == m_catalog)
@@ -30,7 +25,7 @@ void ThemeletTranslator::selectCatalog(const QString &catalog)
         return;
 
     m_catalog = catalog;
-    const QString directory = catalogDirectory();
+    const QString directory = Sysroot::path(QStringLiteral("/usr/share/translations/"));
     const bool engineering = m_engineeringTranslator.load(catalog + QLatin1String("_eng_en"), directory);
     const bool locale = m_localeTranslator.load(QLocale(), catalog, QStringLiteral("-"), directory,
                                                 m_localeSuffix);

@@ -18,12 +18,9 @@ public:
     // off but keeps the remembered name, so that the same catalogue named again
     // later in the batch stays off.
     void selectCatalog(const QString &catalog);
-    bool isLoaded() const { return m_loaded; }
 
     // The locale's translation, else the engineering one, else the text itself.
     QString translate(const QString &text) const;
-
-    static QString catalogDirectory();
 
 private:
     QTranslator m_localeTranslator;

@@ -411,6 +411,10 @@ void tst_ThemeletManager::createAndRemove()
     QCOMPARE(value("SELECT fileName || COUNT(fileId) FROM file LEFT JOIN themelet ON fileId = id WHERE id = "
                    + QString::number(id)), "moved.themelet0");
     QVERIFY(m_manager->remove(id)); // no themelet: the delete still runs
+    // One read from a file has no application wallpaper; the empty path is tried all the same.
+    const qint64 read = addThemelet("read", R"({"wallpaper": "w.jpg"})", true);
+    QTest::ignoreMessage(QtWarningMsg, "QFile::remove: Empty or null file name");
+    QVERIFY(m_manager->remove(read) && !QFile::exists(package("read") + "/images/w.jpg"));
 }
 
 QTEST_GUILESS_MAIN(tst_ThemeletManager)
