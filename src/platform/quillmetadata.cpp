@@ -2,6 +2,7 @@
 
 #include <QDateTime>
 #include <QFile>
+#include <QFileInfo>
 
 #include <exiv2/exiv2.hpp>
 
@@ -57,6 +58,9 @@ QuillMetadata::QuillMetadata(const QString &fileName, int formats)
 {
     muteLibraryLog();
     d->formats = formats;
+    // Only regular files: opening a FIFO would block.
+    if (!QFileInfo(fileName).isFile())
+        return;
     try {
         std::unique_ptr<Exiv2::Image> image(
                 Exiv2::ImageFactory::open(QFile::encodeName(fileName).toStdString()).release());

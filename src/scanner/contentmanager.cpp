@@ -76,9 +76,7 @@ bool ContentManager::updateFirst(QList<ContentManager *> &managers)
 {
     if (managers.isEmpty())
         return false;
-    // A type whose manager doesn't exist yet has a null entry: nothing to drive.
-    ContentManager *head = managers.first();
-    if (head && head->updateMetaData())
+    if (managers.first()->updateMetaData())
         return true;
     managers.removeFirst();
     return !managers.isEmpty();

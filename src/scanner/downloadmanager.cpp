@@ -2,9 +2,6 @@
 
 #include "queryagentdatabase.h"
 
-#include <QDebug>
-#include <QSqlError>
-
 namespace {
 
 const char *const InsertDownloadStatement = "INSERT OR REPLACE INTO download ( fileId, source) VALUES (?, ?);";
@@ -19,15 +16,13 @@ DownloadManager::DownloadManager(QueryAgentDatabase &database)
     , m_insertDownload(database)
     , m_deleteDownload(database)
 {
-    if (!constructorTransaction(ConstructorSignature)) {
-        commit();
-        return;
+    if (constructorTransaction(ConstructorSignature)) {
+        prepareStatements({
+                { &m_insertDownload, InsertDownloadStatement, "Failed to prepare m_insertDownload." },
+                { &m_deleteDownload, DeleteDownloadStatement, "Failed to prepare m_deleteDownload." },
+        }, ConstructorSignature);
     }
-
-    if (!m_insertDownload.prepare(QLatin1String(InsertDownloadStatement)))
-        rollback(m_insertDownload, ConstructorSignature, "Failed to prepare m_insertDownload.");
-    else if (!m_deleteDownload.prepare(QLatin1String(DeleteDownloadStatement)))
-        rollback(m_deleteDownload, ConstructorSignature, "Failed to prepare m_deleteDownload.");
+    // Also after a failure, where it has nothing left to do.
     commit();
 }
 

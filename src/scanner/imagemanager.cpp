@@ -4,9 +4,8 @@
 #include "quillmetadata.h"
 #include "queryagentdatabase.h"
 
-#include <QDebug>
+#include <QFileInfo>
 #include <QImageReader>
-#include <QSqlError>
 
 namespace {
 
@@ -71,7 +70,8 @@ bool ImageManager::updateMetaData()
         ids.append(m_modifiedQuery.value(0).toLongLong());
 
         // Header only: -1 x -1 for anything unreadable, which still counts as read.
-        const QSize size = QImageReader(path, QByteArray()).size();
+        // Only regular files: opening a FIFO would block the whole loop.
+        const QSize size = QFileInfo(path).isFile() ? QImageReader(path, QByteArray()).size() : QSize(-1, -1);
         widths.append(size.width());
         heights.append(size.height());
 
@@ -86,23 +86,11 @@ bool ImageManager::updateMetaData()
 
     transaction();
 
-    m_modifiedReset.addBindValue(ids);
-    if (!m_modifiedReset.execBatch()) {
-        rollback(m_modifiedReset, UpdateSignature, "Failed to execute m_modifiedReset.");
+    if (!execBatch(m_modifiedReset, { ids }, UpdateSignature, "Failed to execute m_modifiedReset.")
+        || !execBatch(m_imageUpdate, { ids, dates, widths, heights, orientations }, UpdateSignature,
+                      "Failed to execute m_imageUpdate.")) {
         return false;
     }
-    m_modifiedReset.finish();
-
-    m_imageUpdate.addBindValue(ids);
-    m_imageUpdate.addBindValue(dates);
-    m_imageUpdate.addBindValue(widths);
-    m_imageUpdate.addBindValue(heights);
-    m_imageUpdate.addBindValue(orientations);
-    if (!m_imageUpdate.execBatch()) {
-        rollback(m_imageUpdate, UpdateSignature, "Failed to execute m_imageUpdate.");
-        return false;
-    }
-    m_imageUpdate.finish();
 
     commit();
     Content::signalChanged(ThemeletContent::Photo);

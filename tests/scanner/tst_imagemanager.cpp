@@ -4,6 +4,8 @@
 
 #include <QTemporaryDir>
 
+#include <sys/stat.h>
+
 namespace {
 const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
 }
@@ -42,6 +44,7 @@ void TestImageManager::step_data()
     QTest::newRow("exif first, xmp fills in") << "" << "64|48|2015-06-02T08:30:00.000|6" << QStringList();
     QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
     QTest::newRow("vanished") << "vanished" << "-1|-1|NULL|NULL" << QStringList();
+    QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
     QTest::newRow("no directory row") << "orphan" << "-1|-1|NULL|NULL" << QStringList();
     // A failed step leaves its rows stale for the next one.
     const char *const function = "virtual bool ImageManager::updateMetaData()";
@@ -62,8 +65,10 @@ void TestImageManager::step()
                                          "set Xmp.tiff.Orientation 3", "set Exif.Image.Orientation 6" }));
     if (damage == "corrupt")
         QVERIFY(file.open(QIODevice::WriteOnly) && file.write(QByteArray(2048, 'x')) == 2048);
-    if (damage == "vanished")
+    if (damage == "vanished" || damage == "fifo")
         QVERIFY(file.remove());
+    if (damage == "fifo")
+        QVERIFY(::mkfifo(QFile::encodeName(file.fileName()).constData(), 0644) == 0);
     file.close();
     m_sql->exec({ s_insert + QString("VALUES (%1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
                   "INSERT INTO image VALUES (1, 'old', 1, 1, 1);" });
