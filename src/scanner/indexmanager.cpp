@@ -149,8 +149,8 @@ bool IndexManager::updateMetaData()
         warn(parentLink, UpdateSignature, "Failed to set directory parent ID.");
     parentLink.finish();
 
-    // ".qm": in the "C" locale the plain catalogue is the locale's one.
-    ThemeletTranslator translator(QStringLiteral(".qm"));
+    // A null suffix: Qt's default, so the locale's catalogues end in ".qm".
+    ThemeletTranslator translator{QString()};
     translator.selectCatalog(root.value(QStringLiteral("translationCatalog")).toString());
 
     QVector<Entry> entries;

@@ -59,7 +59,7 @@ void tst_IndexManager::merge_data()
         {"fileName": "b.ogg", "displayName": "tone-b"}, {"fileName": "c.ogg", "displayName": "tone-c"},
         {"fileName": "e.ogg", "displayName": "tone-e"}]})";
     const QStringList others { "b.ogg|Engineering B|NULL|0", "c.ogg|tone-c|NULL|0", "e.ogg|Engineering E|NULL|0" };
-    QTest::newRow("plain catalogue in C") << "C" << QByteArrayList { translated } << QStringList() << QStringList("a.ogg|Plain A|NULL|0") + others;
+    QTest::newRow("no locale catalogue in C") << "C" << QByteArrayList { translated } << QStringList() << QStringList("a.ogg|Engineering A|NULL|0") + others;
     QTest::newRow("locale catalogue") << "fi_FI" << QByteArrayList { translated } << QStringList() << QStringList("a.ogg|Suomi A|NULL|0") + others;
     // Wrong types count as absent; "a.ogg" and "./a.ogg" are names, not rows.
     QTest::newRow("skipped elements") << "C" << QByteArrayList { R"({"files": [{"fileName": "b.ogg", "displayName": "B",
