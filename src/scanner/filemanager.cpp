@@ -615,3 +615,8 @@ qint64 FileManager::insertFile(const QString &path)
     commit();
     return id;
 }
+
+FileManager *FileManager::instance()
+{
+    return static_cast<FileManager *>(ContentManager::managerFromType(ThemeletContent::File));
+}

@@ -52,6 +52,10 @@ public:
     qint64 insertFile(const QString &path);
     void scheduleUpdate();
 
+    // The process's file manager, made on first use; ContentManager is not its
+    // first base, so the pointer has to be converted.
+    static FileManager *instance();
+
     // True while an update event is on its way or a pass is running.
     bool isUpdateQueued() const { return m_updateQueued; }
 

@@ -25,11 +25,6 @@ const char *const SelectModifiedIndex =
         "SELECT file.id, directory.id, directory.path, file.fileName FROM file LEFT JOIN directory ON file.directoryId = directory.id WHERE file.metadataCurrent = 0 AND file.mimeType = 'application/x-vorka-index' LIMIT 1;";
 const char *const UpdateDirectoryParent = "UPDATE directory SET parentId = ? WHERE id = ?";
 
-FileManager *fileManager()
-{
-    return static_cast<FileManager *>(ContentManager::managerFromType(ThemeletContent::File));
-}
-
 }
 
 struct IndexManager::Entry
@@ -133,7 +128,7 @@ bool IndexManager::updateMetaData()
     }
     const QJsonObject root = document.object();
 
-    FileManager *files = fileManager();
+    FileManager *files = FileManager::instance();
     const QString directory = indexPath.left(indexPath.size() - 6);
     const qint64 directoryId = files
             ? files->appendDirectory(directory, FileManager::IndexScope, FileManager::NoScan)

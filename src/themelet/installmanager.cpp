@@ -27,11 +27,6 @@ const char *const UpdateFavorite = "UPDATE themelet SET favorite = ? WHERE homeW
 
 const QEvent::Type UpdateEvent = QEvent::UpdateRequest;
 
-FileManager *fileManager()
-{
-    return static_cast<FileManager *>(ContentManager::managerFromType(ThemeletContent::File));
-}
-
 // Name below the install directory, as the sort key of the merge.
 QByteArray keyBelow(const QString &parent, const QString &path)
 {
@@ -103,7 +98,7 @@ QStringList InstallManager::installPaths()
 
 void InstallManager::appendDirectory(const QString &path)
 {
-    FileManager *files = fileManager();
+    FileManager *files = FileManager::instance();
     if (!files || files->appendDirectory(path, FileManager::InstallScope, FileManager::ScanNew) == 0)
         return;
     m_pendingDirectories.append(path);
@@ -160,7 +155,7 @@ bool InstallManager::scanInstallDirectory()
 
     qint64 id = 0;
     FileManager::DirectoryScope scope = FileManager::InstallScope;
-    if (FileManager *files = fileManager())
+    if (FileManager *files = FileManager::instance())
         files->watchDirectory(path, &id, &scope);
     if (id == 0)
         return !m_pendingDirectories.isEmpty();
@@ -267,7 +262,7 @@ bool InstallManager::install(const QString &path, const QString &zefId, bool for
 {
     // The scan queued here removes the rows of files that are gone; install
     // itself never deletes a file row.
-    FileManager *files = fileManager();
+    FileManager *files = FileManager::instance();
     const qint64 directoryId = files
             ? files->appendDirectory(path, FileManager::PackageScope, FileManager::ScanAlways)
             : 0;

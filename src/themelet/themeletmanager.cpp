@@ -202,11 +202,6 @@ bool ThemeletManager::prepareStatements()
         }, s_constructorFunction);
 }
 
-FileManager *ThemeletManager::fileManager() const
-{
-    return static_cast<FileManager *>(ContentManager::managerFromType(ThemeletContent::File));
-}
-
 QString ThemeletManager::mimeType() const
 {
     return s_mimeType;
@@ -284,7 +279,7 @@ bool ThemeletManager::updateMetaData()
         return false;
     }
     const QString batchTime = QDateTime::currentDateTime().toUTC().toString(Qt::ISODate);
-    FileManager *files = fileManager();
+    FileManager *files = FileManager::instance();
 
     // Read phase: files and tones, outside any transaction. The tone rows that
     // insertFile makes outlast a rollback of this batch.
@@ -376,7 +371,7 @@ qint64 ThemeletManager::create(const Themelet &themelet)
     const QString path = themelet->url.toLocalFile();
     qint64 id = themelet->id;
     if (id == 0) {
-        FileManager *files = fileManager();
+        FileManager *files = FileManager::instance();
         id = files ? files->insertFile(path) : 0;
         if (id == 0)
             return 0;
@@ -430,7 +425,7 @@ qint64 ThemeletManager::create(const Themelet &themelet)
         // The file was moved: follow it into its new directory.
         const int slash = path.lastIndexOf(QLatin1Char('/'));
         fileName = path.mid(slash + 1);
-        FileManager *files = fileManager();
+        FileManager *files = FileManager::instance();
         directoryId = files ? files->appendDirectory(path.left(slash), FileManager::UserScope,
                                                      FileManager::ScanNew)
                             : 0;
@@ -540,7 +535,7 @@ bool ThemeletManager::save(qint64 id, const QVariantMap &values)
             url.setScheme(QStringLiteral("file"));
         if (!url.isLocalFile())
             continue;
-        FileManager *files = fileManager();
+        FileManager *files = FileManager::instance();
         const qint64 resourceId = files ? files->insertFile(url.toLocalFile()) : 0;
         if (resourceId == 0)
             continue;

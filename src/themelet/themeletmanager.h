@@ -48,7 +48,6 @@ signals:
 private:
     bool prepareStatements();
     Themelet parseThemelet(QSqlQuery *query);
-    FileManager *fileManager() const;
 
     ThemeletQueryAgent m_agent;
     QSqlQuery m_queryThemelet;
