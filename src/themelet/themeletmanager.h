@@ -13,7 +13,6 @@
 #include <QUrl>
 #include <QVariantMap>
 
-class FileManager;
 
 Q_DECLARE_METATYPE(Themelet)
 
