@@ -6,11 +6,9 @@
 #include <QDebug>
 #include <QProcess>
 #include <QSignalSpy>
-#include <QStringList>
 #include <QTest>
 
-// The dconf command line tool as another process that shares the sandbox's
-// store and session bus.
+// The dconf command line tool: another process that shares the sandbox's store and session bus.
 namespace DConfTest {
 
 inline QString run(const QStringList &arguments)
@@ -23,22 +21,12 @@ inline QString run(const QStringList &arguments)
 }
 
 // value is in GVariant text form, e.g. "'text'", "42", "true".
-inline void write(const QString &key, const QString &value)
-{
-    run({ QStringLiteral("write"), key, value });
-}
-
-inline QString read(const QString &key)
-{
-    return run({ QStringLiteral("read"), key });
-}
-
+inline void write(const QString &key, const QString &value) { run({ "write", key, value }); }
+inline QString read(const QString &key) { return run({ "read", key }); }
+// A key, or a whole directory when the path ends with '/'.
 inline void reset(const QString &path)
 {
-    if (path.endsWith(QLatin1Char('/')))
-        run({ QStringLiteral("reset"), QStringLiteral("-f"), path });
-    else
-        run({ QStringLiteral("reset"), path });
+    run(path.endsWith(QLatin1Char('/')) ? QStringList { "reset", "-f", path } : QStringList { "reset", path });
 }
 
 // Returns once every change notice sent before the call has been delivered:

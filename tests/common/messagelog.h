@@ -2,13 +2,14 @@
 #define MESSAGELOG_H
 
 #include <QMutex>
+#include <QRegularExpression>
 #include <QStringList>
 #include <QTest>
-#include <QtGlobal>
 
-// Collects the records written while it lives, from any thread, in order.
+// Collects the records written while it lives, from any thread, in order, as
+// "<level>: <text>" with level one of debug, warning, critical, fatal, info.
 // QTest::ignoreMessage can't tell the order of records; this can. Records are
-// passed on unless told otherwise, so ignoreMessage still applies.
+// passed on when `forward`, so ignoreMessage still applies.
 class MessageLog
 {
 public:
@@ -19,56 +20,27 @@ public:
         s_forward = forward;
         s_previous = qInstallMessageHandler(handler);
     }
-    // Expects `expected`, records as records() gives them: each is handed to
-    // QTest::ignoreMessage, so that one that doesn't come fails the test.
-    explicit MessageLog(const QStringList &expected) : MessageLog(true) { expect(expected); }
-    // {"text"} would otherwise pick the bool constructor.
-    MessageLog(const char *) = delete;
-    ~MessageLog()
+    // Expects these records: each goes to QTest::ignoreMessage, so one that doesn't come fails the test.
+    explicit MessageLog(const QStringList &expected) : MessageLog(true)
     {
-        qInstallMessageHandler(s_previous);
-        QMutexLocker locker(&s_mutex);
-        s_records.clear();
+        for (const QString &record : expected) {
+            const QString level = record.section(QLatin1String(": "), 0, 0);
+            QTest::ignoreMessage(level == QLatin1String("debug") ? QtDebugMsg : level == QLatin1String("critical") ? QtCriticalMsg : QtWarningMsg,
+                                 qPrintable(record.section(QLatin1String(": "), 1)));
+        }
     }
+    MessageLog(const char *) = delete; // {"text"} would otherwise pick the bool constructor
+    ~MessageLog() { qInstallMessageHandler(s_previous); }
 
-    // Every record as "<level>: <text>", level one of debug, warning, critical, fatal, info.
     QStringList records() const
     {
         QMutexLocker locker(&s_mutex);
         return s_records;
     }
-
     // The texts of the warning records only.
-    QStringList warnings() const
-    {
-        const QString prefix = QStringLiteral("warning: ");
-        QStringList result;
-        for (const QString &record : records()) {
-            if (record.startsWith(prefix))
-                result << record.mid(prefix.size());
-        }
-        return result;
-    }
-
-    static void expect(const QStringList &records)
-    {
-        for (const QString &record : records) {
-            const int colon = record.indexOf(QLatin1String(": "));
-            const QString level = record.left(colon);
-            const QtMsgType type = level == QLatin1String("debug") ? QtDebugMsg
-                    : level == QLatin1String("critical") ? QtCriticalMsg : QtWarningMsg;
-            QTest::ignoreMessage(type, qPrintable(record.mid(colon + 2)));
-        }
-    }
-
+    QStringList warnings() const { return records().filter(s_warning).replaceInStrings(s_warning, QString()); }
     // Texts as the records of warnings.
-    static QStringList warningRecords(const QStringList &texts)
-    {
-        QStringList result;
-        for (const QString &text : texts)
-            result << QLatin1String("warning: ") + text;
-        return result;
-    }
+    static QStringList warningRecords(QStringList texts) { return texts.replaceInStrings(QRegularExpression("^"), "warning: "); }
 
 private:
     static void handler(QtMsgType type, const QMessageLogContext &context, const QString &text)
@@ -82,6 +54,7 @@ private:
             s_previous(type, context, text);
     }
 
+    static inline const QRegularExpression s_warning { QStringLiteral("^warning: ") };
     static inline QMutex s_mutex;
     static inline QStringList s_records;
     static inline QtMessageHandler s_previous = nullptr;

@@ -29,11 +29,7 @@ class tst_DbManager : public QObject
     Q_OBJECT
 
 private slots:
-    void init()
-    {
-        QDir(m_system).removeRecursively();
-        QFile::remove(m_system);
-    }
+    void init() { QDir(m_system).removeRecursively(); QFile::remove(m_system); }
 
     void startUp_data()
     {
@@ -47,10 +43,10 @@ private slots:
 
         const QString here = QLocale().name();
         auto step = [](int from, int to) {
-            return QStringLiteral("debug: bool DbManager::updateSchema_v%1to%2() Updating database schema from version %1 to %2!").arg(from).arg(to);
+            return QString("debug: bool DbManager::updateSchema_v%1to%2() Updating database schema from version %1 to %2!").arg(from).arg(to);
         };
         auto written = [](int version) {
-            return QStringLiteral("debug: bool DbManager::updateSchemaVersion(const QString&) Updated themelet database to version:  \"%1\"").arg(version);
+            return QString("debug: bool DbManager::updateSchemaVersion(const QString&) Updated themelet database to version:  \"%1\"").arg(version);
         };
         const QStringList nuke = warnings({ "DbManager::DbManager() Nuking themelet database due previous errors!",
                                             QStringLiteral("Delete:  \"%1\"").arg(m_path) }) << Fine;
@@ -64,8 +60,7 @@ private slots:
         // A failed ALTER doesn't stop the start, but its step writes no version.
         QTest::newRow("11, column there") << 12 << 11 << true << here
                 << QStringList { step(11, 12) } + warnings({ "bool DbManager::updateSchema_v11to12()", "Initialization failed",
-                                                             "\"ALTER TABLE file ADD COLUMN category TEXT;\"",
-                                                             TestDatabase::errorText("1", "duplicate column name: category") }) + QStringList { Fine }
+                        "\"ALTER TABLE file ADD COLUMN category TEXT;\"", TestDatabase::errorText("1", "duplicate column name: category") }) + QStringList { Fine }
                 << 11 << "1 1 1 1 1";
         QTest::newRow("13") << 12 << 13 << true << here
                 << QStringList { "debug: bool DbManager::dropSchema_v13() Reverting database schema version 13!", written(12), Fine }
@@ -126,14 +121,12 @@ private slots:
                         "INSERT INTO file (id, directoryId, mimeType, fileName, permissions, metadataCurrent) VALUES "
                         "(1, 1, 'application/x-vorka-themelet', 'a', 3, 1), (2, 1, 'application/x-vorka-index', 'b', 3, 1), "
                         "(3, 1, 'image/jpeg', 'c', 3, 1), (4, 2, 'application/x-vorka-themelet', 'd', 3, 1), (5, 2, 'audio/ogg', 'e', 3, 1);" });
-            if (schema < 12)
-                old->exec("ALTER TABLE file DROP COLUMN category;");
-            if (schema < 10)
-                old->exec("ALTER TABLE themelet DROP COLUMN version;");
-            if (schema < 8)
-                old->exec("ALTER TABLE themelet DROP COLUMN partnerSpace;");
-            if (!metadataCurrent)
-                old->exec("ALTER TABLE file DROP COLUMN metadataCurrent;");
+            const std::pair<int, const char *> drops[] = { { 12, "file DROP COLUMN category" }, { 10, "themelet DROP COLUMN version" },
+                    { 8, "themelet DROP COLUMN partnerSpace" }, { metadataCurrent ? 0 : 13, "file DROP COLUMN metadataCurrent" } };
+            for (const auto &[below, column] : drops) {
+                if (schema < below)
+                    old->exec(QStringLiteral("ALTER TABLE %1;").arg(column));
+            }
         }
         QMap<QString, ino_t> inodes;
         for (const QString &file : { m_path, m_path + "-shm", m_path + "-wal" }) {
@@ -169,10 +162,9 @@ private slots:
                  QStringLiteral("fileId favorite homeWallpaper applicationWallpaper highlightColor secondaryHighlightColor primaryColor "
                                 "secondaryColor timestamp ringerVolume enabledSounds partnerSpace version"));
         QCOMPARE(db.rows("SELECT metadataCurrent FROM file ORDER BY id").join(' '), flags);
-        if (rebuilt || schema == NoFile)
-            QCOMPARE(db.rows("SELECT name FROM sqlite_master WHERE name NOT LIKE 'sqlite_%' ORDER BY type, name").join(' '),
-                     QStringLiteral("file_directory resource_fileId_resourceType resource_file_id resource_resource_id directory "
-                                    "download file image resource themelet zefId delete_directory_trigger delete_file_trigger"));
+        QCOMPARE(db.rows("SELECT name FROM sqlite_master WHERE name NOT LIKE 'sqlite_%' ORDER BY type, name").join(' '),
+                 QStringLiteral("file_directory resource_fileId_resourceType resource_file_id resource_resource_id directory "
+                                "download file image resource themelet zefId delete_directory_trigger delete_file_trigger"));
     }
 
     void failedRebuild()
@@ -182,9 +174,8 @@ private slots:
         QVERIFY(QDir().mkpath(m_path));
         MessageLog capture(false);
         QVERIFY(!DbManager().isOpen());
-        QCOMPARE(capture.records().filter(QStringLiteral("Nuking")).size(), 1);
-        QCOMPARE(capture.records().last(),
-                 QStringLiteral("critical: DbManager::DbManager: Failed to create DB schema. Can't continue!"));
+        QCOMPARE(capture.records().filter("Nuking").size(), 1);
+        QCOMPARE(capture.records().last(), QStringLiteral("critical: DbManager::DbManager: Failed to create DB schema. Can't continue!"));
     }
 
     void triggers()

@@ -7,32 +7,27 @@
 #include <QtTest>
 
 #include <memory>
+#include <numeric>
+#include <thread>
 #include <unistd.h>
 
 namespace {
 
 const char *const s_childVariable = "TST_QUERYAGENTS_READONLY_CHILD";
 
-// Keeps the batches; names() gives role 5, the display name in every role table.
-class Batches : public QueryAgent::Recipient
+// Keeps the batches and role 5 of each item, the display name in every role table.
+struct Batches : QueryAgent::Recipient
 {
-public:
     void contentQueried(const QVector<Content> &content) override
     {
         sizes << content.size();
+        for (const Content &item : content)
+            names << item.data()->data(5).toString();
         all << content;
     }
-    QString names() const
-    {
-        QStringList names;
-        for (const Content &item : all)
-            names << item.data()->data(5).toString();
-        return names.join(' ');
-    }
-    QVariantMap resources(int i) const { return all.at(i).data()->data(ThemeletData::ResourcesRole).toMap(); }
-
     QList<int> sizes;
     QVector<Content> all;
+    QStringList names;
 };
 
 QString roles(const Content &content, int count)
@@ -57,8 +52,7 @@ int readOnlyChild()
     Batches batches;
     if (!agent || !agent->query(&batches, FileQueryAgent::FileParameters()))
         return 2;
-    const bool shm = QFile::exists(QueryAgent::databaseUrl(0).toLocalFile() + QLatin1String("-shm"));
-    QTextStream(stdout) << batches.names() << (shm ? ";shm" : ";noshm") << '\n';
+    QTextStream(stdout) << batches.names.join(' ') << ";shm " << QFile::exists(QueryAgent::databaseUrl(0).toLocalFile() + "-shm") << '\n';
     return 0;
 }
 
@@ -77,9 +71,8 @@ class tst_QueryAgents : public QObject
         const QFileInfo file(path);
         m_db->exec({ QStringLiteral("INSERT OR IGNORE INTO directory (path, scope) VALUES ('%1', 0)").arg(file.path()),
                      QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, displayName, permissions, category) "
-                                    "SELECT id, '%2', '%3', '%4', 3, %5 FROM directory WHERE path = '%1'")
-                             .arg(file.path(), mimeType, file.fileName(), file.completeBaseName(),
-                                  category.isNull() ? QStringLiteral("NULL") : "'" + category + "'") });
+                                    "SELECT id, '%2', '%3', '%4', 3, NULLIF('%5', '') FROM directory WHERE path = '%1'")
+                             .arg(file.path(), mimeType, file.fileName(), file.completeBaseName(), category) });
         return m_db->value("SELECT max(id) FROM file").toLongLong();
     }
 
@@ -91,11 +84,6 @@ class tst_QueryAgents : public QObject
         return id;
     }
 
-    void addResource(qint64 themelet, const char *type, qint64 target)
-    {
-        m_db->exec(QStringLiteral("INSERT INTO resource VALUES (%1, '%2', %3)").arg(themelet).arg(type).arg(target));
-    }
-
 private slots:
     void initTestCase()
     {
@@ -104,16 +92,13 @@ private slots:
         MessageLog log(QStringList { "debug: DbManager::DbManager() Themelet DB Fine..." });
         QVERIFY(DbManager().isOpen());
         m_db.reset(new TestDatabase);
-    }
-
-    void init()
-    {
-        m_db->exec("DELETE FROM directory"); // the triggers take every other row along
         m_database.reset(new QueryAgentDatabase);
         m_database->setConnectOptions(QStringLiteral("QSQLITE_OPEN_URI"));
         m_database->setDatabaseName(QueryAgent::databaseUrl(0).toString());
         QVERIFY(m_database->open());
     }
+
+    void init() { m_db->exec("DELETE FROM directory"); } // the triggers take every other row along
 
     void statementCache()
     {
@@ -128,24 +113,16 @@ private slots:
         held << prepare(20);
         for (int i : { 2, 3, 19, 20, 0 })
             QCOMPARE(prepare(i).result(), held.at(i).result());
-        const QSqlQuery again = prepare(1);
-        QVERIFY(again.result() != held.at(1).result());
-        QCOMPARE(prepare(1).result(), again.result());
-        QVERIFY(held[1].exec() && held[1].next() && held[1].value(0).toInt() == 1); // the evicted one still works
-    }
+        QVERIFY(prepare(1).result() != held.at(1).result());
 
-    void invalidStatement()
-    {
-        QueryActor actor(*m_database);
+        // An invalid statement gives the full report each time: it is never cached.
         const QStringList report = MessageLog::warningRecords(
                 { "QSqlQuery QueryActor::prepareQuery(const QString&)", "Failed to prepare query",
                   TestDatabase::errorText("1", "no such table: nosuchtable"), "\"SELECT * FROM nosuchtable;\"" });
-        for (int i = 0; i < 2; ++i) { // twice the full report: the statement is never cached
-            MessageLog log(report);
-            QSqlQuery query = actor.prepareQuery(QStringLiteral("SELECT * FROM nosuchtable;"));
-            QCOMPARE(log.records(), report);
-            QVERIFY(query.lastQuery().isEmpty() && !query.exec());
-        }
+        MessageLog log(report + report);
+        for (int i = 0; i < 2; ++i)
+            QVERIFY(actor.prepareQuery(QStringLiteral("SELECT * FROM nosuchtable;")).lastQuery().isEmpty());
+        QCOMPARE(log.records(), report + report);
     }
 
     void agentFor()
@@ -154,34 +131,25 @@ private slots:
         // of the agent's role table; then whether a second call gives the same agent.
         QStringList seen[2];
         for (QStringList &calls : seen) {
-            std::unique_ptr<QThread> thread(QThread::create([&calls] {
+            std::thread([&calls] {
                 for (int type : { 0, 1, 2, 3, 4 }) {
                     QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::Type(type));
                     calls << (agent ? agent->threadId() + ':' + QString::number(agent->roleNames().size()) : "-");
                 }
                 calls << QString::number(QueryAgent::agentFor(ThemeletContent::File) == QueryAgent::agentFor(ThemeletContent::File));
-            }));
-            thread->start();
-            thread->wait();
+            }).join();
             QCOMPARE(calls.join(' '), QStringLiteral("%1:8 %1:24 %1:12 - - 1").arg(calls.first().section(':', 0, 0)));
         }
         QVERIFY(seen[0].first() != seen[1].first());
-    }
 
-    void agentForMissingDirectory()
-    {
+        // With the directory gone, each call tries to open again and fails the same way.
         const QString directory = QFileInfo(TestDatabase::indexPath()).absolutePath();
         QVERIFY(QDir().rename(directory, directory + ".aside"));
-        // Each call tries to open again and fails the same way.
         const QStringList report = MessageLog::warningRecords(
                 { "Database not opened", TestDatabase::errorText("14", "unable to open database file", "Error opening database") });
         MessageLog log(report + report);
         QVector<QueryAgent *> agents;
-        std::unique_ptr<QThread> thread(QThread::create([&agents] {
-            agents << QueryAgent::agentFor(ThemeletContent::File) << QueryAgent::agentFor(ThemeletContent::File);
-        }));
-        thread->start();
-        thread->wait();
+        std::thread([&agents] { agents << QueryAgent::agentFor(ThemeletContent::File) << QueryAgent::agentFor(ThemeletContent::File); }).join();
         QVERIFY(QDir().rename(directory + ".aside", directory));
         QCOMPARE(log.records(), report + report);
         QCOMPARE(agents, QVector<QueryAgent *>(2, nullptr));
@@ -204,113 +172,101 @@ private slots:
         for (const char *suffix : { "", "-wal" })
             QVERIFY(QFile::copy(staging + suffix, target + suffix) && QFile::setPermissions(target + suffix, QFileDevice::Permissions(0x6444)));
         QProcess child;
-        QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
-        environment.insert(s_childVariable, "1");
-        environment.insert("XDG_DATA_HOME", sandbox + "/rodata");
-        child.setProcessEnvironment(environment);
-        child.start("setpriv", { "--reuid=nobody", "--regid=nogroup", "--clear-groups", "--", QCoreApplication::applicationFilePath() });
+        child.start("setpriv", { "--reuid=nobody", "--regid=nogroup", "--clear-groups", "--", "env", QString(s_childVariable) + "=1",
+                                 "XDG_DATA_HOME=" + sandbox + "/rodata", QCoreApplication::applicationFilePath() });
         QVERIFY(child.waitForFinished(30000));
         QVERIFY2(child.exitCode() == 0, child.readAllStandardError().constData());
-        QCOMPARE(child.readAllStandardOutput(), QByteArray("main;noshm\n"));
+        QCOMPARE(child.readAllStandardOutput(), QByteArray("main;shm 0\n"));
     }
 
     void fileList_data()
     {
-        QTest::addColumn<QString>("mimeType");
-        QTest::addColumn<QStringList>("directories");
-        QTest::addColumn<QStringList>("categories");
-        QTest::addColumn<QString>("tail"); // of the statement
+        QTest::addColumn<QString>("parameters"); // mime type; directories; categories
+        QTest::addColumn<QString>("tail");       // of the statement
         QTest::addColumn<QString>("names");
         const QString byName = " ORDER BY  file.displayName ASC;";
-        const QStringList none;
-        QTest::newRow("default") << QString() << none << none << byName << "a b c d e";
-        QTest::newRow("exact mime") << "audio/ogg" << none << none << "WHERE file.mimeType = ?" + byName << "a d";
-        QTest::newRow("mime glob") << "audio/*" << none << none << "WHERE file.mimeType GLOB ?" + byName << "a b d e";
+        QTest::newRow("default") << ";;" << byName << "a b c d e";
+        QTest::newRow("exact mime") << "audio/ogg;;" << "WHERE file.mimeType = ?" + byName << "a d";
+        QTest::newRow("mime glob") << "audio/*;;" << "WHERE file.mimeType GLOB ?" + byName << "a b d e";
         // "/d" takes in neither /d itself nor /dx.
-        QTest::newRow("two directories") << "audio/*" << QStringList { "/d", "/e" } << none
+        QTest::newRow("two directories") << "audio/*;/d /e;"
                 << "WHERE file.mimeType GLOB ?\n     AND (directory.path GLOB ?\n         OR directory.path GLOB ?)" + byName << "b e";
-        QTest::newRow("categories") << QString() << none << QStringList { "Ringtone", "Customer", "Default" }
+        QTest::newRow("categories") << ";;Ringtone Customer Default"
                 << " ORDER BY \n   CASE file.category\n     WHEN 'Ringtone' THEN 0\n     WHEN 'Customer' THEN 1"
                    "\n     WHEN 'Default' THEN 2\n     ELSE 3\n   END, file.displayName ASC;" << "b d a c e";
     }
 
     void fileList()
     {
-        QFETCH(QString, mimeType);
-        QFETCH(QStringList, directories);
-        QFETCH(QStringList, categories);
+        QFETCH(QString, parameters);
         QFETCH(QString, tail);
         QFETCH(QString, names);
-        addFile("/d/a.ogg", "audio/ogg", "Default");
-        addFile("/d/sub/b.mp3", "audio/mpeg", "Ringtone");
-        addFile("/d/sub/deep/c.jpg", "image/jpeg");
-        addFile("/dx/d.ogg", "audio/ogg", "Customer");
-        addFile("/e/sub/e.ogg", "audio/x-vorbis+ogg", "Other");
-        FileQueryAgent::FileParameters parameters;
-        parameters.mimeType = mimeType;
-        parameters.directories = directories;
-        parameters.categories = categories;
+        for (const QString file : { "/d/a.ogg audio/ogg Default", "/d/sub/b.mp3 audio/mpeg Ringtone", "/d/sub/deep/c.jpg image/jpeg",
+                                    "/dx/d.ogg audio/ogg Customer", "/e/sub/e.ogg audio/x-vorbis+ogg Other" })
+            addFile(file.section(' ', 0, 0), file.section(' ', 1, 1), file.section(' ', 2, 2));
+        FileQueryAgent::FileParameters list;
+        list.mimeType = parameters.section(';', 0, 0);
+        list.directories = parameters.section(';', 1, 1).split(' ', Qt::SkipEmptyParts);
+        list.categories = parameters.section(';', 2, 2).split(' ', Qt::SkipEmptyParts);
         QVariantList bound;
-        QCOMPARE(FileQueryAgent::listStatement(parameters, &bound),
+        QCOMPARE(FileQueryAgent::listStatement(list, &bound),
                  "SELECT file.id, directory.path || '/' || file.fileName, file.mimeType, file.fileName, file.displayName, "
                  "file.category, file.permissions FROM file INNER JOIN directory on file.directoryId = directory.id " + tail);
         Batches batches;
-        QVERIFY(FileQueryAgent(*m_database).query(&batches, parameters));
-        QCOMPARE(batches.names(), names);
+        QVERIFY(FileQueryAgent(*m_database).query(&batches, list));
+        QCOMPARE(batches.names.join(' '), names);
     }
 
-    void fileLookups()
+    void queries()
     {
-        addFile("/d/other.ogg");
-        const qint64 id = addFile("/d/sub dir/tone #1.ogg", "audio/ogg", "Ringtone");
-        m_db->exec({ QStringLiteral("UPDATE file SET permissions = 1 WHERE id = %1").arg(id),
-                     QStringLiteral("INSERT INTO download VALUES (%1, 'http://example.com/t.ogg')").arg(id) });
-        FileQueryAgent agent(*m_database);
-        const QUrl url = QUrl::fromLocalFile("/d/sub dir/tone #1.ogg");
-        for (const Content &found : { agent.queryById(id), agent.queryByUrl(url), agent.queryByUrl(QUrl("http://example.com/t.ogg")) })
-            QCOMPARE(roles(found, 8), QStringLiteral("%1|%2|audio/ogg|tone #1.ogg|/d/sub dir/tone #1.ogg|tone #1|true|Ringtone")
-                                              .arg(id).arg(url.toString()));
-        QVERIFY(!agent.queryByUrl(QUrl("http://example.com/other.ogg")).isValid());
-        QVERIFY(!agent.queryByUrl(QUrl::fromLocalFile("/d/missing.ogg")).isValid());
-    }
-
-    void themeletFilters_data()
-    {
-        QTest::addColumn<int>("filter");
-        QTest::addColumn<QString>("names");
-        QTest::newRow("all") << 0 << "T4 T2 T3 T1"; // favourites first, then by time
-        QTest::newRow("favourites") << 1 << "T4 T2";
-        QTest::newRow("others") << 2 << "T3 T1";
-    }
-
-    void themeletFilters()
-    {
-        QFETCH(int, filter);
-        QFETCH(QString, names);
-        addThemelet("T1", false, 2);
-        addThemelet("T2", true, 3);
-        addThemelet("T3", false, 1);
-        addThemelet("T4", true, 0);
-        ThemeletQueryAgent agent(*m_database);
-        ThemeletQueryAgent::ThemeletParameters parameters;
-        parameters.filter = filter;
-        for (int run = 0; run < 2; ++run) { // the temporary table of the first run is gone
+        const qint64 file = addFile("/d/sub dir/tone #1.ogg", "audio/ogg", "Ringtone");
+        const qint64 themelet = addThemelet("Sea", true, 3);
+        for (const QString other : { "T1 0 2", "T3 0 1", "T4 1 0" })
+            addThemelet(other.section(' ', 0, 0), other.section(' ', 1, 1).toInt(), other.section(' ', 2, 2).toInt());
+        m_db->exec({ QStringLiteral("UPDATE file SET permissions = 1 WHERE id = %1").arg(file),
+                     QStringLiteral("UPDATE themelet SET homeWallpaper = '/h.jpg', applicationWallpaper = '/a.jpg', "
+                                    "highlightColor = '#112233', secondaryHighlightColor = '#80445566', primaryColor = '#778899', "
+                                    "secondaryColor = '#aabbcc', ringerVolume = NULL, enabledSounds = 5, version = 3 WHERE fileId = %1").arg(themelet),
+                     QStringLiteral("INSERT INTO zefId VALUES (%1, 'zef')").arg(themelet),
+                     QStringLiteral("INSERT INTO resource VALUES (%1, 'ringerTone', %2)").arg(themelet).arg(addFile("/r/sea.ogg")),
+                     QStringLiteral("INSERT INTO download VALUES (%1, 'http://example.com/t.ogg'), (%2, 'http://example.com/sea.themelet')")
+                             .arg(file).arg(themelet) });
+        // Filters 0, 1 and 2: favourites first, then by time; each query's temporary table is gone before the next.
+        ThemeletQueryAgent themelets(*m_database);
+        QStringList lists;
+        for (int filter : { 0, 1, 2 }) {
+            ThemeletQueryAgent::ThemeletParameters parameters;
+            parameters.filter = filter;
             Batches batches;
-            QVERIFY(agent.query(&batches, parameters));
-            QCOMPARE(batches.sizes, QList<int> { names.count(' ') + 1 });
-            QCOMPARE(batches.names(), names);
+            QVERIFY(themelets.query(&batches, parameters));
+            lists << batches.names.join(' ');
         }
+        QCOMPARE(lists, (QStringList { "T4 Sea T3 T1", "T4 Sea", "T3 T1" }));
+
+        // Lookups by id, by local url (with a space and a '#'), by the url it was downloaded from.
+        FileQueryAgent files(*m_database);
+        const QUrl url = QUrl::fromLocalFile("/d/sub dir/tone #1.ogg");
+        for (const Content &found : { files.queryById(file), files.queryByUrl(url), files.queryByUrl(QUrl("http://example.com/t.ogg")) })
+            QCOMPARE(roles(found, 8), QStringLiteral("%1|%2|audio/ogg|tone #1.ogg|/d/sub dir/tone #1.ogg|tone #1|true|Ringtone")
+                                              .arg(file).arg(url.toString()));
+        const QUrl sea = QUrl::fromLocalFile("/t/Sea.themelet");
+        for (const Content &found : { themelets.queryById(themelet), themelets.queryByUrl(sea),
+                                      themelets.queryByUrl(QUrl("http://example.com/sea.themelet")) }) {
+            QCOMPARE(roles(found, 24), QStringLiteral("%1|%2|application/x-vorka-themelet|Sea.themelet|/t/Sea.themelet|Sea|true|"
+                                                      "file:///h.jpg|file:///a.jpg|#778899|#aabbcc|#112233|#80445566|0|"
+                                                      "true|false|true|false|false|false|false||zef|3").arg(themelet).arg(sea.toString()));
+            QCOMPARE(found.data()->data(ThemeletData::ResourcesRole).toMap(), QVariantMap({ { "ringerTone", resource("/r/sea.ogg") } }));
+        }
+        for (const Content &missing : { files.queryByUrl(QUrl("http://example.com/other.ogg")), files.queryByUrl(QUrl::fromLocalFile("/d/x.ogg")),
+                                        themelets.queryByUrl(url), themelets.queryByUrl(QUrl("http://example.com/t.ogg")) })
+            QVERIFY(!missing.isValid());
     }
 
     void batches_data()
     {
-        QTest::addColumn<int>("rows");
-        QTest::addColumn<QList<int>>("sizes");
-        QTest::newRow("0") << 0 << QList<int> { 0 };
-        QTest::newRow("49") << 49 << QList<int> { 49 };
-        QTest::newRow("50") << 50 << QList<int> { 50, 0 };
-        QTest::newRow("51") << 51 << QList<int> { 50, 1 };
-        QTest::newRow("100") << 100 << QList<int> { 50, 50, 0 };
+        QTest::addColumn<QList<int>>("sizes"); // of the batches; the rows are their sum
+        for (const QList<int> &sizes : QList<QList<int>> { { 0 }, { 49 }, { 50, 0 }, { 50, 1 }, { 50, 50, 0 } })
+            QTest::addRow("%d", std::accumulate(sizes.cbegin(), sizes.cend(), 0)) << sizes;
     }
 
     void batches()
@@ -318,50 +274,27 @@ private slots:
         // Resources on the 50th and 51st: the first batch ends with the 50th's,
         // the second starts with the cursor on the 51st's. A resource whose file
         // is gone doesn't stop the merge.
-        QFETCH(int, rows);
         QFETCH(QList<int>, sizes);
+        const int rows = std::accumulate(sizes.cbegin(), sizes.cend(), 0);
         QStringList names;
-        QVector<qint64> ids { 0 };
         m_db->exec("BEGIN");
-        for (int i = 1; i <= rows; ++i)
-            ids << addThemelet((names << QStringLiteral("T%1").arg(i)).last(), false, i);
-        if (rows >= 50)
-            addResource(ids[50], "ringerTone", addFile("/r/50.ogg"));
-        if (rows >= 51) {
-            addResource(ids[51], "ringerTone", 9999);
-            addResource(ids[51], "messageTone", addFile("/r/51.ogg"));
-            addResource(ids[51], "homeWallpaper", addFile("/r/51.jpg", "image/jpeg"));
+        for (int i = 1; i <= rows; ++i) {
+            const qint64 id = addThemelet((names << QStringLiteral("T%1").arg(i)).last(), false, i);
+            if (i == 50)
+                m_db->exec(QStringLiteral("INSERT INTO resource VALUES (%1, 'ringerTone', %2)").arg(id).arg(addFile("/r/50.ogg")));
+            if (i == 51)
+                m_db->exec(QStringLiteral("INSERT INTO resource VALUES (%1, 'ringerTone', 9999), (%1, 'messageTone', %2), (%1, 'homeWallpaper', %3)")
+                                   .arg(id).arg(addFile("/r/51.ogg")).arg(addFile("/r/51.jpg", "image/jpeg")));
         }
         m_db->exec("COMMIT");
         Batches batches;
         QVERIFY(ThemeletQueryAgent(*m_database).query(&batches, ThemeletQueryAgent::ThemeletParameters()));
         QCOMPARE(batches.sizes, sizes);
-        QCOMPARE(batches.names(), names.join(' '));
+        QCOMPARE(batches.names, names);
         const QVariantMap at50 { { "ringerTone", resource("/r/50.ogg") } };
         const QVariantMap at51 { { "messageTone", resource("/r/51.ogg") }, { "homeWallpaper", resource("/r/51.jpg") } };
         for (int i = 0; i < rows; ++i)
-            QCOMPARE(batches.resources(i), i == 49 ? at50 : i == 50 ? at51 : QVariantMap());
-    }
-
-    void themeletLookups()
-    {
-        addThemelet("Other", false, 0);
-        const qint64 id = addThemelet("Sea", true, 1);
-        m_db->exec({ QStringLiteral("UPDATE themelet SET homeWallpaper = '/h.jpg', applicationWallpaper = '/a.jpg', "
-                                    "highlightColor = '#112233', secondaryHighlightColor = '#80445566', primaryColor = '#778899', "
-                                    "secondaryColor = '#aabbcc', ringerVolume = NULL, enabledSounds = 5, version = 3 WHERE fileId = %1").arg(id),
-                     QStringLiteral("INSERT INTO zefId VALUES (%1, 'zef')").arg(id),
-                     QStringLiteral("INSERT INTO download VALUES (%1, 'http://example.com/sea.themelet')").arg(id) });
-        addResource(id, "ringerTone", addFile("/r/sea.ogg"));
-        ThemeletQueryAgent agent(*m_database);
-        const QUrl url = QUrl::fromLocalFile("/t/Sea.themelet");
-        for (const Content &found : { agent.queryById(id), agent.queryByUrl(url), agent.queryByUrl(QUrl("http://example.com/sea.themelet")) }) {
-            QCOMPARE(roles(found, 24), QStringLiteral("%1|%2|application/x-vorka-themelet|Sea.themelet|/t/Sea.themelet|Sea|true|"
-                                                      "file:///h.jpg|file:///a.jpg|#778899|#aabbcc|#112233|#80445566|0|"
-                                                      "true|false|true|false|false|false|false||zef|3").arg(id).arg(url.toString()));
-            QCOMPARE(found.data()->data(ThemeletData::ResourcesRole).toMap(), QVariantMap({ { "ringerTone", resource("/r/sea.ogg") } }));
-        }
-        QVERIFY(!agent.queryByUrl(QUrl("http://example.com/none.themelet")).isValid());
+            QCOMPARE(batches.all.at(i).data()->data(ThemeletData::ResourcesRole).toMap(), i == 49 ? at50 : i == 50 ? at51 : QVariantMap());
     }
 };
 
