@@ -1,38 +1,37 @@
-#include "managertestcase.h"
+#include "indexfixture.h"
 
 #include "imagemanager.h"
 
-#include <QTemporaryDir>
-
 #include <sys/stat.h>
+
+using namespace Fixture;
 
 namespace {
 const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
 }
 
-class TestImageManager : public QObject, private ManagerTestCase
+class TestImageManager : public QObject
 {
     Q_OBJECT
 
+    TestDatabase m_sql { serviceIndex() };
+    QString m_dir;
+
+    int stale() { return m_sql.value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0;").toInt(); }
+
 private slots:
-    void init();
+    void init()
+    {
+        QVERIFY(QDir().mkpath(m_dir = uniquePath()));
+        m_sql.exec({ "DROP TRIGGER IF EXISTS refuse;", "DELETE FROM directory;", "DELETE FROM file;",
+                      QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir) });
+        SignalRecorder::clear();
+    }
     void step_data();
     void step();
     void batches_data();
     void batches();
-
-private:
-    int stale() { return m_sql->value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0;").toInt(); }
-
-    std::unique_ptr<QTemporaryDir> m_dir;
 };
-
-void TestImageManager::init()
-{
-    m_dir.reset(new QTemporaryDir);
-    openFreshIndex();
-    m_sql->exec(QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir->path()));
-}
 
 void TestImageManager::step_data()
 {
@@ -59,27 +58,25 @@ void TestImageManager::step()
     QFETCH(QString, damage);
     QFETCH(QString, image);
     QFETCH(QStringList, warnings);
-
-    QFile file(m_dir->filePath("picture.jpg"));
-    QVERIFY(writeJpeg(file.fileName(), { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00",
-                                         "set Xmp.tiff.Orientation 3", "set Exif.Image.Orientation 6" }));
+    const QString path = m_dir + "/picture.jpg";
     if (damage == "corrupt")
-        QVERIFY(file.open(QIODevice::WriteOnly) && file.write(QByteArray(2048, 'x')) == 2048);
-    if (damage == "vanished" || damage == "fifo")
-        QVERIFY(file.remove());
-    if (damage == "fifo")
-        QVERIFY(::mkfifo(QFile::encodeName(file.fileName()).constData(), 0644) == 0);
-    file.close();
-    m_sql->exec({ s_insert + QString("VALUES (%1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
+        QVERIFY(write(path, QByteArray(2048, 'x')));
+    else if (damage == "fifo")
+        QVERIFY(::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
+    else if (damage != "vanished")
+        QVERIFY(writeJpeg(path, { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00", "set Xmp.tiff.Orientation 3",
+                                  "set Exif.Image.Orientation 6" }));
+    m_sql.exec({ QString("INSERT INTO file (id, directoryId, mimeType, fileName, permissions, metadataCurrent) "
+                          "VALUES (1, %1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
                   "INSERT INTO image VALUES (1, 'old', 1, 1, 1);" });
     if (damage.contains(" ON "))
-        m_sql->exec(QString("CREATE TRIGGER refuse BEFORE %1 BEGIN SELECT RAISE(ABORT, 'no'); END;").arg(damage));
+        m_sql.exec(QString("CREATE TRIGGER refuse BEFORE %1 BEGIN SELECT RAISE(ABORT, 'no'); END;").arg(damage));
 
     MessageLog log(false);
-    ImageManager manager(*m_db);
+    ImageManager manager(DbManager::instance());
     QVERIFY(!manager.updateMetaData());
     compareWarnings(log, warnings);
-    QCOMPARE(m_sql->rows("SELECT width, height, dateTaken, orientation FROM image;"), QStringList { image });
+    QCOMPARE(m_sql.rows("SELECT width, height, dateTaken, orientation FROM image;"), QStringList { image });
     QCOMPARE(stale(), warnings.isEmpty() ? 0 : 1);
     QCOMPARE(SignalRecorder::calls(), warnings.isEmpty() ? QList<int> { 2 } : QList<int>());
 }
@@ -98,17 +95,16 @@ void TestImageManager::batches()
 {
     QFETCH(int, count);
     QFETCH(QList<int>, marked);
-
-    QVERIFY(writeJpeg(m_dir->filePath("0.jpg")));
+    QVERIFY(writeJpeg(m_dir + "/0.jpg"));
     for (int i = 1; i <= count; ++i)
-        QVERIFY(QFile::copy(m_dir->filePath("0.jpg"), m_dir->filePath(QString("%1.jpg").arg(i))));
+        QVERIFY(QFile::copy(m_dir + "/0.jpg", m_dir + QString("/%1.jpg").arg(i)));
     // Never selected: no "image/" in front (GLOB is case-sensitive), or current already.
-    m_sql->exec({ QString("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < %1) ").arg(count)
+    m_sql.exec({ QString("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < %1) ").arg(count)
                           + s_insert + "SELECT 1, 'image/jpeg', i || '.jpg', 3, 0 FROM n;",
                   s_insert + "VALUES (1, 'audio/ogg', 'a', 3, 0), (1, 'imagejpeg', 'b', 3, 0), (1, 'image', 'c', 3, 0),"
                              " (1, 'application/image', 'd', 3, 0), (1, 'Image/jpeg', 'e', 3, 0), (1, 'image/png', 'f', 3, 1);" });
 
-    ImageManager manager(*m_db);
+    ImageManager manager(DbManager::instance());
     QList<int> calls;
     for (int step : marked) {
         const int before = stale();
@@ -118,7 +114,7 @@ void TestImageManager::batches()
         QCOMPARE(SignalRecorder::calls(), calls);
     }
     QCOMPARE(stale(), 5);
-    QCOMPARE(m_sql->value("SELECT COUNT(*) FROM image WHERE width = 64 AND height = 48;").toInt(), count);
+    QCOMPARE(m_sql.value("SELECT COUNT(*) FROM image WHERE width = 64 AND height = 48;").toInt(), count);
 }
 
 QTEST_GUILESS_MAIN(TestImageManager)

@@ -1,12 +1,9 @@
-#include "messagelog.h"
-#include "packagefixture.h"
-#include "signalrecorder.h"
+#include "indexfixture.h"
 #include "sysroot.h"
 
-#include <memory>
 #include <sys/stat.h>
 
-using namespace PackageFixture;
+using namespace Fixture;
 
 // Tone packs under the sounds install directory, each with `tones.index`
 // describing its `tones/` directory, read by the install loop alone.
@@ -14,13 +11,8 @@ class tst_IndexManager : public QObject
 {
     Q_OBJECT
 
-private slots:
-    void initTestCase();
-    void merge_data();
-    void merge();
-    void changeNotices();
+    TestDatabase m_db { serviceIndex() };
 
-private:
     static QString pack() { return uniquePath(InstallManager::installPaths().at(1)); }
     static QString tones() { return pack() + QStringLiteral("/tones"); }
     static bool runWith(const QByteArray &content)
@@ -29,18 +21,19 @@ private:
         return write(tones() + QStringLiteral(".index"), content) && waitIdle();
     }
 
-    std::unique_ptr<TestDatabase> m_db;
+private slots:
+    void initTestCase()
+    {
+        const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
+        QVERIFY(QDir().mkpath(translations));
+        for (const char *catalog : { "tones.qm", "tones-fi.qm", "tones_eng_en.qm" })
+            QVERIFY(QFile::copy(QStringLiteral(CATALOG_DIR "/") + catalog, translations + catalog));
+        QVERIFY(installer());
+    }
+    void merge_data();
+    void merge();
+    void changeNotices();
 };
-
-void tst_IndexManager::initTestCase()
-{
-    const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
-    QVERIFY(QDir().mkpath(translations));
-    for (const char *catalog : { "tones.qm", "tones-fi.qm", "tones_eng_en.qm" })
-        QVERIFY(QFile::copy(QStringLiteral(CATALOG_DIR "/") + catalog, translations + catalog));
-    QVERIFY(installer());
-    m_db = std::make_unique<TestDatabase>();
-}
 
 void tst_IndexManager::merge_data()
 {
@@ -95,36 +88,36 @@ void tst_IndexManager::merge()
     QVERIFY(writeTree(tones(), { "a.ogg", "b.ogg", "c.ogg", "e.ogg" }));
     MessageLog log(false);
     QVERIFY(runWith(indexes.first()));
-    const QString firstMax = m_db->value(QStringLiteral("SELECT max(id) FROM file")).toString();
+    const QString firstMax = m_db.value(QStringLiteral("SELECT max(id) FROM file")).toString();
     for (const QByteArray &index : indexes.mid(1))
         QVERIFY(runWith(index));
 
     QCOMPARE(log.warnings(), warnings.replaceInStrings("%1", tones() + QStringLiteral(".index")));
-    QCOMPARE(fileRows(*m_db, tones(), QStringLiteral("fileName, displayName, category, id > %1").arg(firstMax)), expected);
-    QCOMPARE(fileRows(*m_db, tones(), "permissions, mimeType").removeAll("1|audio/ogg"), expected.size());
+    QCOMPARE(m_db.fileRows(tones(), QStringLiteral("fileName, displayName, category, id > %1").arg(firstMax)), expected);
+    QCOMPARE(m_db.fileRows(tones(), "permissions, mimeType").removeAll("1|audio/ogg"), expected.size());
     // Below the package, so that the next start scans it; described by the index alone.
-    QCOMPARE(m_db->rows(QStringLiteral("SELECT scope, parentId = (SELECT id FROM directory WHERE path = '%1') FROM directory "
+    QCOMPARE(m_db.rows(QStringLiteral("SELECT scope, parentId = (SELECT id FROM directory WHERE path = '%1') FROM directory "
                                        "WHERE path = '%2'").arg(pack(), tones())), QStringList { "3|1" });
     // Read, and not tried again even when bad.
-    QCOMPARE(fileRows(*m_db, pack(), "metadataCurrent"), QStringList { "1" });
+    QCOMPARE(m_db.fileRows(pack(), "metadataCurrent"), QStringList { "1" });
 }
 
 void tst_IndexManager::changeNotices()
 {
     const QString index = tones() + QStringLiteral(".index");
     QVERIFY(write(tones() + QStringLiteral("/a.ogg")) && runWith(R"({"files": [{"fileName": "a.ogg"}]})"));
-    const QString markStale = QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE directoryId = %1").arg(directoryId(*m_db, pack()));
+    const QString markStale = QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE directoryId = %1").arg(m_db.directoryId(pack()));
     ContentManager *indexes = ContentManager::managerFromType(7);
 
     // A notice only when rows change, one file a call; a FIFO is passed over, not waited for.
     SignalRecorder::clear();
-    QVERIFY(m_db->exec(markStale) && indexes->updateMetaData());
+    QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
     QCOMPARE(SignalRecorder::calls(), QList<int>());
-    QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db->exec(markStale));
+    QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db.exec(markStale));
     QVERIFY(indexes->updateMetaData() && !indexes->updateMetaData());
     QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
     QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
-    QVERIFY(m_db->exec(markStale) && indexes->updateMetaData());
+    QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
 }
 
 QTEST_GUILESS_MAIN(tst_IndexManager)
