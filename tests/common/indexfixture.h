@@ -24,7 +24,6 @@ inline QString serviceIndex()
     return TestDatabase::indexPath();
 }
 
-inline InstallManager *installer() { return static_cast<InstallManager *>(ContentManager::managerFromType(6)); }
 
 // A name of its own for each test function and data row.
 inline QString uniquePath(const QString &parent = qEnvironmentVariable("THEMELET_SANDBOX"))
@@ -89,6 +88,15 @@ inline bool waitIdle()
     }
     QCoreApplication::instance()->removeEventFilter(&counter);
     return quietRounds >= 2;
+}
+
+inline InstallManager *installer() { return static_cast<InstallManager *>(ContentManager::managerFromType(6)); }
+
+// The install loop walks the directory, and all loops run until idle.
+inline bool installFrom(const QString &directory)
+{
+    installer()->appendDirectory(directory);
+    return waitIdle();
 }
 
 // The records of a failed statement, as patterns: function, message, error, statement.

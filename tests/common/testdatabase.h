@@ -75,7 +75,10 @@ public:
         return result;
     }
 
-    QString directoryId(const QString &path) { return value(QStringLiteral("SELECT id FROM directory WHERE path = '%1'").arg(path)).toString(); }
+    QString directoryId(const QString &path)
+    {
+        return value(QStringLiteral("SELECT id FROM directory WHERE path = '%1'").arg(path)).toString();
+    }
 
     // The file rows of a directory by name, the ZEF id at hand as `zefId`.
     QStringList fileRows(const QString &directory, const QString &columns)
