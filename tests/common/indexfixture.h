@@ -24,7 +24,6 @@ inline QString serviceIndex()
     return TestDatabase::indexPath();
 }
 
-
 // A name of its own for each test function and data row.
 inline QString uniquePath(const QString &parent = qEnvironmentVariable("THEMELET_SANDBOX"))
 {

@@ -54,13 +54,13 @@ class tst_FileManager : public QObject
             const QString parent = QString("FROM directory WHERE path = '%1';").arg(info.path());
             if (entry.contains('='))
                 m_sql.exec(QString("INSERT INTO directory (path, scope) VALUES ('%1', %2);")
-                                    .arg(QDir::cleanPath(info.filePath()), entry.section('=', 1)));
+                                   .arg(QDir::cleanPath(info.filePath()), entry.section('=', 1)));
             else if (name.endsWith('/'))
                 m_sql.exec(QString("INSERT INTO directory (parentId, path, scope) SELECT id, '%1', 0 ").arg(info.filePath()) + parent);
             else
                 m_sql.exec(QString("INSERT INTO file (directoryId, fileName, modificationTime, permissions, metadataCurrent)"
-                                    " SELECT id, '%1', '%2', 3, 1 ").arg(info.fileName(), info.lastModified().addSecs(
-                                            entry.endsWith('~') ? -60 : 0).toString(Qt::ISODateWithMs)) + parent);
+                                   " SELECT id, '%1', '%2', 3, 1 ").arg(info.fileName(), info.lastModified().addSecs(
+                                           entry.endsWith('~') ? -60 : 0).toString(Qt::ISODateWithMs)) + parent);
         }
         m_mark = m_sql.value("SELECT MAX(id) FROM file;").toLongLong();
     }
@@ -71,8 +71,8 @@ class tst_FileManager : public QObject
     {
         const QString where = QString(" WHERE path = '%1' OR path LIKE '%1/%'").arg(root), from = QString::number(root.size() + 2);
         return sorted(m_sql.rows("SELECT substr(path, " + from + ") || '/' FROM directory" + where + " UNION ALL SELECT CASE WHEN "
-                                  "file.id > " + QString::number(m_mark) + " THEN '+' ELSE '' END || substr(path || '/' || fileName, "
-                                  + from + ") || '|' || metadataCurrent FROM file JOIN directory ON directory.id = directoryId" + where));
+                                 "file.id > " + QString::number(m_mark) + " THEN '+' ELSE '' END || substr(path || '/' || fileName, "
+                                 + from + ") || '|' || metadataCurrent FROM file JOIN directory ON directory.id = directoryId" + where));
     }
 
 private slots:
@@ -220,8 +220,7 @@ private slots:
         QVERIFY(QDir().mkpath(pictures));
         QVERIFY(writeJpeg(shot, { "set Exif.Photo.DateTimeOriginal 2014:05:01 12:00:00", "set Exif.Image.Orientation 6" }));
         FileManager *manager = FileManager::instance();
-        QVERIFY(manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0);
-        QVERIFY(waitIdle());
+        QVERIFY(manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
         SignalRecorder::clear();
 
         // The read alone, as the loop would deliver it: the steps it posts haven't run yet.

@@ -6,9 +6,7 @@
 
 using namespace Fixture;
 
-namespace {
-const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
-}
+static const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
 
 class TestImageManager : public QObject
 {
@@ -24,7 +22,7 @@ private slots:
     {
         QVERIFY(QDir().mkpath(m_dir = uniquePath()));
         m_sql.exec({ "DROP TRIGGER IF EXISTS refuse;", "DELETE FROM directory;", "DELETE FROM file;",
-                      QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir) });
+                     QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir) });
         SignalRecorder::clear();
     }
 

@@ -94,7 +94,7 @@ private slots:
         QCOMPARE(m_db.fileRows(tones(), "permissions, mimeType").removeAll("1|audio/ogg"), expected.size());
         // Below the package, so that the next start scans it; described by the index alone.
         QCOMPARE(m_db.rows(QStringLiteral("SELECT scope, parentId = (SELECT id FROM directory WHERE path = '%1') FROM directory "
-                                           "WHERE path = '%2'").arg(pack(), tones())), QStringList { "3|1" });
+                                          "WHERE path = '%2'").arg(pack(), tones())), QStringList { "3|1" });
         // Read, and not tried again even when bad.
         QCOMPARE(m_db.fileRows(pack(), "metadataCurrent"), QStringList { "1" });
     }

@@ -1,3 +1,4 @@
+#include "dconftest.h"
 #include "indexfixture.h"
 #include "profiledefaults.h"
 #include "sysroot.h"
@@ -7,8 +8,11 @@
 
 using namespace Fixture;
 
-static const QString s_resources = QStringLiteral("SELECT resourceType, fileName FROM resource "
-                                                  "JOIN file ON resourceId = file.id ORDER BY resourceType");
+static const QString s_resources = "SELECT resourceType, fileName FROM resource JOIN file ON resourceId = file.id ORDER BY resourceType";
+
+static const QString s_sourceKey = QStringLiteral("/desktop/lunda/background/portrait/picture_filename");
+static const QString s_applicationKey = QStringLiteral("/desktop/vorka/background/portrait/app_picture_filename");
+static const QString s_homeKey = QStringLiteral("/desktop/vorka/background/portrait/home_picture_filename");
 
 static QString package(const QString &name) { return Sysroot::path(QStringLiteral("/usr/share/themelet/")) + name; }
 static QString user(const QString &name) { return qEnvironmentVariable("THEMELET_SANDBOX") + "/user/" + name; }
@@ -159,7 +163,8 @@ private slots:
         QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
         // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
         QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
-                << failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.", "INSERT INTO themelet ( fileId,")
+                << failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
+                           "INSERT INTO themelet ( fileId,")
                 << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
     }
 
@@ -276,6 +281,49 @@ private slots:
                            "JOIN file ON fileId = file.id"), QStringList { row });
         QCOMPARE(m_db.rows(s_resources), resources);
         QCOMPARE(SignalRecorder::calls(), QList<int>()); // the caller tells the clients
+    }
+
+    void settingsSignals_data()
+    {
+        QTest::addColumn<QString>("key");
+        QTest::addColumn<QString>("value"); // given to the key's setter, or written by dconf if GVariant text
+        QTest::addColumn<QString>("state"); // signals of source, application and home image, then the values
+        QTest::newRow("source") << s_sourceKey << "file:///t/sun set.themelet" << "100 file:///t/sun set.themelet||";
+        QTest::newRow("remote source clears") << s_sourceKey << "http://x/a.themelet" << "100 ||";
+        QTest::newRow("application image") << s_applicationKey << "/p/app.jpg" << "010 |/p/app.jpg|";
+        QTest::newRow("home image") << s_homeKey << "relative.jpg" << "001 ||relative.jpg";
+        QTest::newRow("other process") << s_sourceKey << "'/t/a.themelet'" << "100 file:///t/a.themelet||";
+    }
+
+    // ThemeletSettings: a setter emits nothing, the signal comes once the store reports the change.
+    void settingsSignals()
+    {
+        QFETCH(QString, key);
+        QFETCH(QString, value);
+        QFETCH(QString, state);
+        for (const QString &each : { s_sourceKey, s_applicationKey, s_homeKey })
+            DConfTest::reset(each);
+        QVERIFY(DConfTest::barrier());
+        ThemeletSettings settings;
+        QSignalSpy source(&settings, &ThemeletSettings::sourceChanged), application(&settings, &ThemeletSettings::applicationImageChanged),
+                home(&settings, &ThemeletSettings::homeImageChanged);
+        const auto current = [&] {
+            return QStringLiteral("%1%2%3 ").arg(source.count()).arg(application.count()).arg(home.count())
+                    + settings.source().toString() + '|' + settings.applicationImagePath() + '|' + settings.homeImagePath();
+        };
+        QCOMPARE(current(), QStringLiteral("000 ||")); // unset keys read empty
+
+        if (value.startsWith('\''))
+            DConfTest::write(key, value);
+        else if (key == s_sourceKey)
+            settings.setSource(QUrl(value));
+        else if (key == s_homeKey)
+            settings.setHomeImagePath(value);
+        else
+            settings.setApplicationImagePath(value);
+        QCOMPARE(current().left(3), QStringLiteral("000"));
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(current(), state);
     }
 
     void activeThemelet()
