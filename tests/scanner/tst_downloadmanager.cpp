@@ -1,43 +1,41 @@
-#include "managertestcase.h"
+#include "indexfixture.h"
 
 #include "downloadmanager.h"
 
-#include <QUrl>
+using namespace Fixture;
 
-class TestDownloadManager : public QObject, private ManagerTestCase
+class TestDownloadManager : public QObject
 {
     Q_OBJECT
 
+    TestDatabase m_sql { serviceIndex() };
+    QString source() { return m_sql.value("SELECT source FROM download WHERE fileId = 1;").toString(); }
+
 private slots:
-    void init() { openFreshIndex(); m_sql->exec("INSERT INTO download VALUES (1, 'http://old.example/a.jpg');"); }
-    void save();
-    void removeTakesAnInt();
+    void init() { m_sql.exec({ "DELETE FROM download;", "INSERT INTO download VALUES (1, 'http://old.example/a.jpg');" }); }
 
-private:
-    QString source() { return m_sql->value("SELECT source FROM download WHERE fileId = 1;").toString(); }
+    void save()
+    {
+        DownloadManager manager(DbManager::instance());
+        QVERIFY(manager.save(1, { { "Source", QUrl("http://new.example/b.jpg") } })); // only "source" counts
+        QCOMPARE(source(), QString("http://old.example/a.jpg"));
+        QVERIFY(manager.save(1, { { "source", QUrl("http://new.example/b.jpg") } }));
+        QCOMPARE(source(), QString("http://new.example/b.jpg"));
+        QVERIFY(manager.save(1, { { "source", 42 } })); // not a URL: an empty one
+        QCOMPARE(source(), QString());
+    }
+
+    // remove(int) hides the virtual remove(qint64) instead of overriding it.
+    void removeTakesAnInt()
+    {
+        QVERIFY(dynamic_cast<DownloadManager *>(ContentManager::managerFromType(4)));
+        DownloadManager manager(DbManager::instance());
+        QVERIFY(!static_cast<ContentManager &>(manager).remove(qint64(1)));
+        QCOMPARE(source(), QString("http://old.example/a.jpg"));
+        QVERIFY(manager.remove(1));
+        QCOMPARE(m_sql.value("SELECT COUNT(*) FROM download;").toInt(), 0);
+    }
 };
-
-void TestDownloadManager::save()
-{
-    DownloadManager manager(*m_db);
-    QVERIFY(manager.save(1, { { "Source", QUrl("http://new.example/b.jpg") } })); // only "source" counts
-    QCOMPARE(source(), QString("http://old.example/a.jpg"));
-    QVERIFY(manager.save(1, { { "source", QUrl("http://new.example/b.jpg") } }));
-    QCOMPARE(source(), QString("http://new.example/b.jpg"));
-    QVERIFY(manager.save(1, { { "source", 42 } })); // not a URL: an empty one
-    QCOMPARE(source(), QString());
-}
-
-// remove(int) hides the virtual remove(qint64) instead of overriding it.
-void TestDownloadManager::removeTakesAnInt()
-{
-    QVERIFY(dynamic_cast<DownloadManager *>(ContentManager::managerFromType(4)));
-    DownloadManager manager(*m_db);
-    QVERIFY(!static_cast<ContentManager &>(manager).remove(qint64(1)));
-    QCOMPARE(source(), QString("http://old.example/a.jpg"));
-    QVERIFY(manager.remove(1));
-    QCOMPARE(m_sql->value("SELECT COUNT(*) FROM download;").toInt(), 0);
-}
 
 QTEST_GUILESS_MAIN(TestDownloadManager)
 #include "tst_downloadmanager.moc"

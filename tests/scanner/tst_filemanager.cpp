@@ -1,10 +1,8 @@
-#include "filemanagerloop.h"
-#include "managertestcase.h"
-
-#include <QDir>
-#include <QtTest>
+#include "indexfixture.h"
 
 #include <sys/inotify.h>
+
+using namespace Fixture;
 
 namespace {
 
@@ -19,12 +17,6 @@ struct Case
     QStringList warnings = {};
     QString steps = {};
 };
-
-QString newTree()
-{
-    static int s_count = 0;
-    return qEnvironmentVariable("THEMELET_SANDBOX") + "/tree" + QString::number(++s_count);
-}
 
 // Changes on disk as a shell script run in directory, made if need be: one
 // process, so all of its events wait for one read.
@@ -45,195 +37,204 @@ Q_DECLARE_METATYPE(Case)
 
 // FileManager against real inotify in the sandbox, the sandbox index through
 // the service's own connection and the event loop run until the manager is idle.
-class tst_FileManager : public QObject, private ManagerTestCase
+class tst_FileManager : public QObject
 {
     Q_OBJECT
 
-private slots:
-    void initTestCase() { DbManager::instance(); m_sql.reset(new TestDatabase); }
-    void init();
-    void scanAndEvents_data();
-    void scanAndEvents();
-    void appendDirectory();
-    void insertFile();
-
-private:
-    void addRows(const QString &root, const QString &rows);
-    QString tree(const QString &root);
-
+    TestDatabase m_sql { serviceIndex() };
     qint64 m_mark = 0; // rows above it are new
+
+    // Current rows: "f" a file with its time on disk, "f~" with an older time, "d/" a directory and
+    // "d/=s" a root of scope s ("/=s" root itself).
+    void addRows(const QString &root, const QString &rows)
+    {
+        for (const QString &entry : rows.split(' ', Qt::SkipEmptyParts)) {
+            const QString name = entry.section(QRegularExpression("[~=]"), 0, 0);
+            const QFileInfo info(root + '/' + name.chopped(name.endsWith('/') ? 1 : 0));
+            const QString parent = QString("FROM directory WHERE path = '%1';").arg(info.path());
+            if (entry.contains('='))
+                m_sql.exec(QString("INSERT INTO directory (path, scope) VALUES ('%1', %2);")
+                                   .arg(QDir::cleanPath(info.filePath()), entry.section('=', 1)));
+            else if (name.endsWith('/'))
+                m_sql.exec(QString("INSERT INTO directory (parentId, path, scope) SELECT id, '%1', 0 ").arg(info.filePath()) + parent);
+            else
+                m_sql.exec(QString("INSERT INTO file (directoryId, fileName, modificationTime, permissions, metadataCurrent)"
+                                   " SELECT id, '%1', '%2', 3, 1 ").arg(info.fileName(), info.lastModified().addSecs(
+                                           entry.endsWith('~') ? -60 : 0).toString(Qt::ISODateWithMs)) + parent);
+        }
+        m_mark = m_sql.value("SELECT MAX(id) FROM file;").toLongLong();
+    }
+
+    // The index below root, sorted: "d/" a directory ("/" root), "f|metadataCurrent" a file, "+f|..."
+    // a file whose row is newer than the last addRows().
+    QString tree(const QString &root)
+    {
+        const QString where = QString(" WHERE path = '%1' OR path LIKE '%1/%'").arg(root), from = QString::number(root.size() + 2);
+        return sorted(m_sql.rows("SELECT substr(path, " + from + ") || '/' FROM directory" + where + " UNION ALL SELECT CASE WHEN "
+                                 "file.id > " + QString::number(m_mark) + " THEN '+' ELSE '' END || substr(path || '/' || fileName, "
+                                 + from + ") || '|' || metadataCurrent FROM file JOIN directory ON directory.id = directoryId" + where));
+    }
+
+private slots:
+    void init()
+    {
+        m_sql.exec({ "DELETE FROM file;", "DELETE FROM directory;" });
+        m_mark = 0;
+        SignalRecorder::clear();
+    }
+
+    void scanAndEvents_data()
+    {
+        QTest::addColumn<Case>("c");
+
+        // A known subdirectory is walked in every scope, under its own scope (0).
+        const QString disk = "mkdir fresh k; touch a b c k/x", rows = "b c~ d gone/ gone/v k/";
+        QTest::newRow("user") << Case { 0, disk, rows, "", "/ +a|0 b|1 c|0 fresh/ k/ +k/x|0", 3 };
+        QTest::newRow("install") << Case { 1, disk, rows, "", "/ b|1 c|0 k/ +k/x|0", 2 };
+        QTest::newRow("package") << Case { 2, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
+        QTest::newRow("index") << Case { 3, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
+        QTest::newRow("empty listing") << Case { 0, "", "a b", "", "/", 1 };
+        QTest::newRow("listing ends on a match") << Case { 0, "touch a b", "a b c", "", "/ a|1 b|1", 1 };
+        // The row fetched when the listing runs out stays until the next scan; the rows after it go.
+        QTest::newRow("gap at the end of the listing") << Case { 0, "touch a b", "c d", "", "/ +a|0 +b|0 c|1", 1 };
+        // U+FF21 sorts before U+1F600 in UTF-8, after it in UTF-16.
+        const QString wide = QString::fromUtf8("\xef\xbc\xa1"), emoji = QString::fromUtf8("\xf0\x9f\x98\x80");
+        QTest::newRow("utf-8 byte order") << Case { 0, "touch " + emoji + ' ' + wide + " Z a", wide + ' ' + emoji + " a", "",
+                                                    "/ +Z|0 a|1 " + emoji + "|1 " + wide + "|1", 1 };
+        QTest::newRow("hidden entries and links")
+                << Case { 0, "mkdir .hd d; touch t .h .hd/i; ln -s t lf; ln -s d ld", "", "", "/ d/ +lf|0 +t|0", 2 };
+        QTest::newRow("breadth first, a directory a step") << Case { 0, "mkdir -p A/C B; touch r A/a B/b A/C/c", "", "",
+                "/ A/ A/C/ B/ +A/a|0 +A/C/c|0 +B/b|0 +r|0", 4, {}, "r ar abr abcr abcr" };
+        // S is a root of its own: inserting it as a child fails, the scan of its parent rolls back
+        // and the loop stops.
+        QTest::newRow("a known root is not adopted") << Case { 0, "mkdir S; touch r", "S/=1", "", "/ S/", 0,
+                failure("bool FileManager::scanDirectory()", "Failed to execute m_directoryInsert.", "INSERT INTO directory") };
+
+        QTest::newRow("move within the directory") << Case { 0, "touch a", "a", "mv a b", "/ +b|0", 2 };
+        QTest::newRow("move onto a known file") << Case { 0, "touch a b", "a b", "mv a b", "/ b|0", 2 };
+        QTest::newRow("create, delete, create: rolled back") << Case { 0, "", "", "touch f; rm f; touch f", "/", 1,
+                failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
+        // By kind, not in the order of the events: deletes last.
+        QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
+        // Scope 1 doesn't add files.
+        QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
+        QStringList many { "/" };
+        for (int i = 0; i < 200; ++i)
+            many << QString::asprintf("+file-with-a-longer-name-%03d|0", i);
+        QTest::newRow("more than 4096 bytes") << Case { 0, "", "", "touch $(seq -f file-with-a-longer-name-%03g 0 199)", many.join(' '), 2 };
+        // Unlike a scan, an event adds a hidden file.
+        QTest::newRow("unknown watch, hidden file") << Case { 0, "", "", "?touch ../foreign mine .h", "/ +.h|0 +mine|0", 2 };
+        QTest::newRow("name not in UTF-8") << Case { 0, "", "", "touch \"$(printf 'bad\\377')\" ok", "/ +ok|0", 2,
+                { "^Skipping a file name that is not valid UTF-8 \".*/\" \"bad\\\\xFF\"$" } };
+        const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
+        QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
+        QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
+        // The failed watch is reported and the scan goes on, finding nothing.
+        QTest::newRow("directory gone before its scan") << Case { 0, "", "", "mkdir N; rmdir N", "/ N/", 3,
+                                                                  { "^Failed to add listener -1 \".*/N\"$" } };
+    }
+
+    void scanAndEvents()
+    {
+        QFETCH(Case, c);
+        const QString root = uniquePath();
+        run(root, c.disk);
+        addRows(root, QString("/=%1 ").arg(c.scope) + c.rows);
+        MessageLog log(false);
+        FileManager manager(DbManager::instance(), nullptr); // queues the roots
+        QStringList names;
+        for (int i = 0; i < 10 && manager.isUpdateQueued(); ++i) {
+            QCoreApplication::sendPostedEvents(&manager, QEvent::UpdateRequest);
+            names << m_sql.value("SELECT group_concat(fileName, '') FROM (SELECT fileName FROM file ORDER BY fileName);").toString();
+        }
+        QVERIFY(!manager.isUpdateQueued());
+        if (c.changes.startsWith('?')) // a watch of someone else's on the manager's descriptor
+            QVERIFY(inotify_add_watch(int(manager.socket()), qPrintable(root + "/.."), IN_CREATE) >= 0);
+        run(root, c.changes.mid(c.changes.startsWith('?') ? 1 : 0));
+        if (c.changes.contains("seq")) // more than the stack buffer holds
+            QVERIFY(pendingBytes(manager) > 4096);
+        QVERIFY(waitIdle());
+
+        compareWarnings(log, c.warnings);
+        QCOMPARE(tree(root), sorted(c.after.split(' ')));
+        QCOMPARE(SignalRecorder::calls(), QVector<int>(c.signalCount, 0).toList());
+        if (!c.steps.isEmpty())
+            QCOMPARE(names.join(' '), c.steps);
+    }
+
+    void appendDirectory()
+    {
+        const QString root = uniquePath();
+        run(root, "touch f");
+        FileManager manager(DbManager::instance(), nullptr);
+        const qint64 id = manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew);
+        QVERIFY(id > 0 && waitIdle());
+        addRows(root, "absent");
+
+        QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew), id);
+        QVERIFY(!manager.isUpdateQueued());
+        QCOMPARE(manager.appendDirectory(root + "/missing", FileManager::UserScope, FileManager::ScanAlways), 0);
+        QVERIFY(!manager.isUpdateQueued());
+        // A live watch means the directory is in step: the queued scan passes over it.
+        QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanAlways), id);
+        QVERIFY(manager.isUpdateQueued());
+        QVERIFY(waitIdle());
+        QCOMPARE(tree(root), QString("/ absent|1 f|0"));
+
+        // A new scope without a scan removes the watch; unwatched, ScanAlways scans.
+        QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::NoScan), id);
+        QVERIFY(!manager.isUpdateQueued());
+        QVERIFY(waitIdle()); // the IN_IGNORED of the removed watch
+        QCOMPARE(m_sql.rows("SELECT scope FROM directory;"), QStringList { "1" });
+        run(root, "echo x >> f");
+        QCOMPARE(pendingBytes(manager), 0);
+        QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::ScanAlways), id);
+        QVERIFY(waitIdle());
+        QCOMPARE(tree(root), QString("/ f|0"));
+    }
+
+    void insertFile()
+    {
+        const QString root = uniquePath();
+        run(root, "touch t.txt other");
+        FileManager manager(DbManager::instance(), nullptr);
+        QCOMPARE(manager.insertFile(root + "/missing"), 0);
+        const qint64 id = manager.insertFile(root + "/t.txt");
+        QVERIFY(id > 0);
+        QCOMPARE(manager.insertFile(root + "/t.txt"), id);
+
+        // An unknown directory becomes a root of scope 1: scanned in that scope, and watched.
+        QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id;"),
+                 QStringList { "NULL|1|text/plain|3" });
+        QVERIFY(waitIdle());
+        QCOMPARE(tree(root), QString("+t.txt|0 /"));
+        run(root, "echo x >> t.txt");
+        QVERIFY(pendingBytes(manager) > 0);
+    }
+
+    // A picture that lands in a watched directory, followed by the service's own
+    // loop: the event gives a stale file row, a later step reads the picture.
+    void roadOfChange()
+    {
+        const QString pictures = uniquePath(), shot = pictures + ".jpg";
+        QVERIFY(QDir().mkpath(pictures));
+        QVERIFY(writeJpeg(shot, { "set Exif.Photo.DateTimeOriginal 2014:05:01 12:00:00", "set Exif.Image.Orientation 6" }));
+        FileManager *manager = FileManager::instance();
+        QVERIFY(manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
+        SignalRecorder::clear();
+
+        // The read alone, as the loop would deliver it: the steps it posts haven't run yet.
+        QVERIFY(QFile::rename(shot, pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
+        QEvent read(QEvent::SockAct);
+        QCoreApplication::sendEvent(manager, &read);
+        const QString state = "SELECT fileName, mimeType, permissions, metadataCurrent, width, height, dateTaken, orientation "
+                              "FROM file LEFT JOIN image ON fileId = id;";
+        QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|0|NULL|NULL|NULL|NULL" });
+        QVERIFY(waitIdle());
+        QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 2 }));
+        QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|1|64|48|2014-05-01T12:00:00.000|6" });
+    }
 };
-
-void tst_FileManager::init()
-{
-    m_sql->exec({ "DELETE FROM file;", "DELETE FROM directory;" });
-    m_mark = 0;
-    SignalRecorder::clear();
-}
-
-// Current rows: "f" a file with its time on disk, "f~" with an older time, "d/" a directory and
-// "d/=s" a root of scope s ("/=s" root itself).
-void tst_FileManager::addRows(const QString &root, const QString &rows)
-{
-    for (const QString &entry : rows.split(' ', Qt::SkipEmptyParts)) {
-        const QString name = entry.section(QRegularExpression("[~=]"), 0, 0);
-        const QFileInfo info(root + '/' + name.chopped(name.endsWith('/') ? 1 : 0));
-        const QString parent = QString("FROM directory WHERE path = '%1';").arg(info.path());
-        if (entry.contains('='))
-            m_sql->exec(QString("INSERT INTO directory (path, scope) VALUES ('%1', %2);")
-                                .arg(QDir::cleanPath(info.filePath()), entry.section('=', 1)));
-        else if (name.endsWith('/'))
-            m_sql->exec(QString("INSERT INTO directory (parentId, path, scope) SELECT id, '%1', 0 ").arg(info.filePath()) + parent);
-        else
-            m_sql->exec(QString("INSERT INTO file (directoryId, fileName, modificationTime, permissions, metadataCurrent)"
-                                " SELECT id, '%1', '%2', 3, 1 ").arg(info.fileName(), info.lastModified().addSecs(
-                                        entry.endsWith('~') ? -60 : 0).toString(Qt::ISODateWithMs)) + parent);
-    }
-    m_mark = m_sql->value("SELECT MAX(id) FROM file;").toLongLong();
-}
-
-// The index below root, sorted: "d/" a directory ("/" root), "f|metadataCurrent" a file, "+f|..."
-// a file whose row is newer than the last addRows().
-QString tst_FileManager::tree(const QString &root)
-{
-    const QString where = QString("WHERE path = '%1' OR path LIKE '%1/%'").arg(root);
-    return sorted(m_sql->rows(QString("SELECT substr(path, %1) || '/' FROM directory ").arg(root.size() + 2) + where)
-                  + m_sql->rows(QString("SELECT CASE WHEN file.id > %1 THEN '+' ELSE '' END || substr(path || '/' || "
-                                        "fileName, %2) || '|' || metadataCurrent FROM file JOIN directory ON directory.id"
-                                        " = directoryId ").arg(m_mark).arg(root.size() + 2) + where));
-}
-
-void tst_FileManager::scanAndEvents_data()
-{
-    QTest::addColumn<Case>("c");
-
-    // A known subdirectory is walked in every scope, under its own scope (0).
-    const QString disk = "mkdir fresh k; touch a b c k/x", rows = "b c~ d gone/ gone/v k/";
-    QTest::newRow("user") << Case { 0, disk, rows, "", "/ +a|0 b|1 c|0 fresh/ k/ +k/x|0", 3 };
-    QTest::newRow("install") << Case { 1, disk, rows, "", "/ b|1 c|0 k/ +k/x|0", 2 };
-    QTest::newRow("package") << Case { 2, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
-    QTest::newRow("index") << Case { 3, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
-    QTest::newRow("empty listing") << Case { 0, "", "a b", "", "/", 1 };
-    QTest::newRow("listing ends on a match") << Case { 0, "touch a b", "a b c", "", "/ a|1 b|1", 1 };
-    // The row fetched when the listing runs out stays until the next scan; the rows after it go.
-    QTest::newRow("gap at the end of the listing") << Case { 0, "touch a b", "c d", "", "/ +a|0 +b|0 c|1", 1 };
-    // U+FF21 sorts before U+1F600 in UTF-8, after it in UTF-16.
-    const QString wide = QString::fromUtf8("\xef\xbc\xa1"), emoji = QString::fromUtf8("\xf0\x9f\x98\x80");
-    QTest::newRow("utf-8 byte order") << Case { 0, "touch " + emoji + ' ' + wide + " Z a", wide + ' ' + emoji + " a", "",
-                                                "/ +Z|0 a|1 " + emoji + "|1 " + wide + "|1", 1 };
-    QTest::newRow("hidden entries and links")
-            << Case { 0, "mkdir .hd d; touch t .h .hd/i; ln -s t lf; ln -s d ld", "", "", "/ d/ +lf|0 +t|0", 2 };
-    QTest::newRow("breadth first, a directory a step") << Case { 0, "mkdir -p A/C B; touch r A/a B/b A/C/c", "", "",
-            "/ A/ A/C/ B/ +A/a|0 +A/C/c|0 +B/b|0 +r|0", 4, {}, "r ar abr abcr abcr" };
-    // S is a root of its own: inserting it as a child fails, the scan of its parent rolls back
-    // and the loop stops.
-    QTest::newRow("a known root is not adopted") << Case { 0, "mkdir S; touch r", "S/=1", "", "/ S/", 0,
-            failure("bool FileManager::scanDirectory()", "Failed to execute m_directoryInsert.", "INSERT INTO directory") };
-
-    QTest::newRow("move within the directory") << Case { 0, "touch a", "a", "mv a b", "/ +b|0", 2 };
-    QTest::newRow("move onto a known file") << Case { 0, "touch a b", "a b", "mv a b", "/ b|0", 2 };
-    QTest::newRow("create, delete, create: rolled back") << Case { 0, "", "", "touch f; rm f; touch f", "/", 1,
-            failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
-    // By kind, not in the order of the events: deletes last.
-    QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
-    // Scope 1 doesn't add files.
-    QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
-    QStringList many { "/" };
-    for (int i = 0; i < 200; ++i)
-        many << QString::asprintf("+file-with-a-longer-name-%03d|0", i);
-    QTest::newRow("more than 4096 bytes")
-            << Case { 0, "", "", "touch $(seq -f file-with-a-longer-name-%03g 0 199)", many.join(' '), 2 };
-    QTest::newRow("unknown watch") << Case { 0, "", "", "?touch ../foreign mine", "/ +mine|0", 2 };
-    QTest::newRow("hidden file") << Case { 0, "", "", "touch .h", "/ +.h|0", 2 };
-    QTest::newRow("name not in UTF-8") << Case { 0, "", "", "touch \"$(printf 'bad\\377')\" ok", "/ +ok|0", 2,
-            { "^Skipping a file name that is not valid UTF-8 \".*/\" \"bad\\\\xFF\"$" } };
-    const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
-    QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
-    QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
-    // The failed watch is reported and the scan goes on, finding nothing.
-    QTest::newRow("directory gone before its scan")
-            << Case { 0, "", "", "mkdir N; rmdir N", "/ N/", 3, { "^Failed to add listener -1 \".*/N\"$" } };
-}
-
-void tst_FileManager::scanAndEvents()
-{
-    QFETCH(Case, c);
-
-    const QString root = newTree();
-    run(root, c.disk);
-    addRows(root, QString("/=%1 ").arg(c.scope) + c.rows);
-    MessageLog log(false);
-    FileManager manager(DbManager::instance(), nullptr); // queues the roots
-    QStringList names;
-    for (int i = 0; i < 10 && manager.isUpdateQueued(); ++i) {
-        QCoreApplication::sendPostedEvents(&manager, QEvent::UpdateRequest);
-        names << m_sql->value("SELECT group_concat(fileName, '') FROM (SELECT fileName FROM file ORDER BY fileName);").toString();
-    }
-    QVERIFY(!manager.isUpdateQueued());
-    if (c.changes.startsWith('?')) // a watch of someone else's on the manager's descriptor
-        QVERIFY(inotify_add_watch(int(manager.socket()), qPrintable(root + "/.."), IN_CREATE) >= 0);
-    run(root, c.changes.mid(c.changes.startsWith('?') ? 1 : 0));
-    if (c.changes.contains("seq")) // more than the stack buffer holds
-        QVERIFY(pendingBytes(manager) > 4096);
-    QVERIFY(settle(manager));
-
-    compareWarnings(log, c.warnings);
-    QCOMPARE(tree(root), sorted(c.after.split(' ')));
-    QCOMPARE(SignalRecorder::calls(), QVector<int>(c.signalCount, 0).toList());
-    if (!c.steps.isEmpty())
-        QCOMPARE(names.join(' '), c.steps);
-}
-
-void tst_FileManager::appendDirectory()
-{
-    const QString root = newTree();
-    run(root, "touch f");
-    FileManager manager(DbManager::instance(), nullptr);
-    const qint64 id = manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew);
-    QVERIFY(id > 0);
-    QVERIFY(settle(manager));
-    addRows(root, "absent");
-
-    QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew), id);
-    QVERIFY(!manager.isUpdateQueued());
-    QCOMPARE(manager.appendDirectory(root + "/missing", FileManager::UserScope, FileManager::ScanAlways), 0);
-    QVERIFY(!manager.isUpdateQueued());
-    // A live watch means the directory is in step: the queued scan passes over it.
-    QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanAlways), id);
-    QVERIFY(manager.isUpdateQueued());
-    QVERIFY(settle(manager));
-    QCOMPARE(tree(root), QString("/ absent|1 f|0"));
-
-    // A new scope without a scan removes the watch; unwatched, ScanAlways scans.
-    QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::NoScan), id);
-    QVERIFY(!manager.isUpdateQueued());
-    QVERIFY(settle(manager)); // the IN_IGNORED of the removed watch
-    QCOMPARE(m_sql->rows("SELECT scope FROM directory;"), QStringList { "1" });
-    run(root, "echo x >> f");
-    QCOMPARE(pendingBytes(manager), 0);
-    QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::ScanAlways), id);
-    QVERIFY(settle(manager));
-    QCOMPARE(tree(root), QString("/ f|0"));
-}
-
-void tst_FileManager::insertFile()
-{
-    const QString root = newTree();
-    run(root, "touch t.txt other");
-    FileManager manager(DbManager::instance(), nullptr);
-    QCOMPARE(manager.insertFile(root + "/missing"), 0);
-    const qint64 id = manager.insertFile(root + "/t.txt");
-    QVERIFY(id > 0);
-    QCOMPARE(manager.insertFile(root + "/t.txt"), id);
-
-    // An unknown directory becomes a root of scope 1: scanned in that scope, and watched.
-    QCOMPARE(m_sql->rows("SELECT parentId, scope FROM directory;"), QStringList { "NULL|1" });
-    QCOMPARE(m_sql->rows("SELECT mimeType, permissions FROM file;"), QStringList { "text/plain|3" });
-    QVERIFY(settle(manager));
-    QCOMPARE(tree(root), sorted({ "/", "+t.txt|0" }));
-    run(root, "echo x >> t.txt");
-    QVERIFY(pendingBytes(manager) > 0);
-}
 
 QTEST_GUILESS_MAIN(tst_FileManager)
 #include "tst_filemanager.moc"

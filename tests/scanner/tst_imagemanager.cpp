@@ -1,125 +1,115 @@
-#include "managertestcase.h"
+#include "indexfixture.h"
 
 #include "imagemanager.h"
 
-#include <QTemporaryDir>
-
 #include <sys/stat.h>
 
-namespace {
-const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
-}
+using namespace Fixture;
 
-class TestImageManager : public QObject, private ManagerTestCase
+static const QString s_insert = "INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) ";
+
+class TestImageManager : public QObject
 {
     Q_OBJECT
 
+    TestDatabase m_sql { serviceIndex() };
+    QString m_dir;
+
+    int stale() { return m_sql.value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0;").toInt(); }
+
 private slots:
-    void init();
-    void step_data();
-    void step();
-    void batches_data();
-    void batches();
-
-private:
-    int stale() { return m_sql->value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0;").toInt(); }
-
-    std::unique_ptr<QTemporaryDir> m_dir;
-};
-
-void TestImageManager::init()
-{
-    m_dir.reset(new QTemporaryDir);
-    openFreshIndex();
-    m_sql->exec(QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir->path()));
-}
-
-void TestImageManager::step_data()
-{
-    QTest::addColumn<QString>("damage");
-    QTest::addColumn<QString>("image");
-    QTest::addColumn<QStringList>("warnings");
-
-    // Unreadable files are read like any other: they get a row and become current.
-    QTest::newRow("exif first, xmp fills in") << "" << "64|48|2015-06-02T08:30:00.000|6" << QStringList();
-    QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
-    QTest::newRow("vanished") << "vanished" << "-1|-1|NULL|NULL" << QStringList();
-    QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
-    QTest::newRow("no directory row") << "orphan" << "-1|-1|NULL|NULL" << QStringList();
-    // A failed step leaves its rows stale for the next one.
-    const char *const function = "virtual bool ImageManager::updateMetaData()";
-    QTest::newRow("failed reset") << "UPDATE ON file" << "1|1|old|1" << failure(function,
-            "Failed to execute m_modifiedReset.", "UPDATE file SET metadataCurrent = 1 WHERE id = ?;");
-    QTest::newRow("failed image write") << "INSERT ON image" << "1|1|old|1" << failure(function, "Failed to execute "
-            "m_imageUpdate.", "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) VALUES (?, ?, ?, ?, ?);");
-}
-
-void TestImageManager::step()
-{
-    QFETCH(QString, damage);
-    QFETCH(QString, image);
-    QFETCH(QStringList, warnings);
-
-    QFile file(m_dir->filePath("picture.jpg"));
-    QVERIFY(writeJpeg(file.fileName(), { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00",
-                                         "set Xmp.tiff.Orientation 3", "set Exif.Image.Orientation 6" }));
-    if (damage == "corrupt")
-        QVERIFY(file.open(QIODevice::WriteOnly) && file.write(QByteArray(2048, 'x')) == 2048);
-    if (damage == "vanished" || damage == "fifo")
-        QVERIFY(file.remove());
-    if (damage == "fifo")
-        QVERIFY(::mkfifo(QFile::encodeName(file.fileName()).constData(), 0644) == 0);
-    file.close();
-    m_sql->exec({ s_insert + QString("VALUES (%1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
-                  "INSERT INTO image VALUES (1, 'old', 1, 1, 1);" });
-    if (damage.contains(" ON "))
-        m_sql->exec(QString("CREATE TRIGGER refuse BEFORE %1 BEGIN SELECT RAISE(ABORT, 'no'); END;").arg(damage));
-
-    MessageLog log(false);
-    ImageManager manager(*m_db);
-    QVERIFY(!manager.updateMetaData());
-    compareWarnings(log, warnings);
-    QCOMPARE(m_sql->rows("SELECT width, height, dateTaken, orientation FROM image;"), QStringList { image });
-    QCOMPARE(stale(), warnings.isEmpty() ? 0 : 1);
-    QCOMPARE(SignalRecorder::calls(), warnings.isEmpty() ? QList<int> { 2 } : QList<int>());
-}
-
-void TestImageManager::batches_data()
-{
-    QTest::addColumn<int>("count");
-    QTest::addColumn<QList<int>>("marked"); // made current by each step; a full batch asks for more
-
-    QTest::newRow("99") << 99 << QList<int> { 99 };
-    QTest::newRow("100") << 100 << QList<int> { 100, 0 };
-    QTest::newRow("101") << 101 << QList<int> { 100, 1 };
-}
-
-void TestImageManager::batches()
-{
-    QFETCH(int, count);
-    QFETCH(QList<int>, marked);
-
-    QVERIFY(writeJpeg(m_dir->filePath("0.jpg")));
-    for (int i = 1; i <= count; ++i)
-        QVERIFY(QFile::copy(m_dir->filePath("0.jpg"), m_dir->filePath(QString("%1.jpg").arg(i))));
-    // Never selected: no "image/" in front (GLOB is case-sensitive), or current already.
-    m_sql->exec({ QString("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < %1) ").arg(count)
-                          + s_insert + "SELECT 1, 'image/jpeg', i || '.jpg', 3, 0 FROM n;",
-                  s_insert + "VALUES (1, 'audio/ogg', 'a', 3, 0), (1, 'imagejpeg', 'b', 3, 0), (1, 'image', 'c', 3, 0),"
-                             " (1, 'application/image', 'd', 3, 0), (1, 'Image/jpeg', 'e', 3, 0), (1, 'image/png', 'f', 3, 1);" });
-
-    ImageManager manager(*m_db);
-    QList<int> calls;
-    for (int step : marked) {
-        const int before = stale();
-        QCOMPARE(manager.updateMetaData(), step == 100);
-        QCOMPARE(before - stale(), step);
-        calls << QList<int> { 2 }.mid(0, step ? 1 : 0);
-        QCOMPARE(SignalRecorder::calls(), calls);
+    void init()
+    {
+        QVERIFY(QDir().mkpath(m_dir = uniquePath()));
+        m_sql.exec({ "DROP TRIGGER IF EXISTS refuse;", "DELETE FROM directory;", "DELETE FROM file;",
+                     QString("INSERT INTO directory (id, path, scope) VALUES (1, '%1', 0);").arg(m_dir) });
+        SignalRecorder::clear();
     }
-    QCOMPARE(stale(), 5);
-    QCOMPARE(m_sql->value("SELECT COUNT(*) FROM image WHERE width = 64 AND height = 48;").toInt(), count);
-}
+
+    void step_data()
+    {
+        QTest::addColumn<QString>("damage");
+        QTest::addColumn<QString>("image");
+        QTest::addColumn<QStringList>("warnings");
+
+        // Unreadable files are read like any other: they get a row and become current.
+        QTest::newRow("exif first, xmp fills in") << "" << "64|48|2015-06-02T08:30:00.000|6" << QStringList();
+        QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
+        QTest::newRow("vanished") << "vanished" << "-1|-1|NULL|NULL" << QStringList();
+        QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
+        QTest::newRow("no directory row") << "orphan" << "-1|-1|NULL|NULL" << QStringList();
+        // A failed step leaves its rows stale for the next one.
+        const char *const function = "virtual bool ImageManager::updateMetaData()";
+        QTest::newRow("failed reset") << "UPDATE ON file" << "1|1|old|1" << failure(function,
+                "Failed to execute m_modifiedReset.", "UPDATE file SET metadataCurrent = 1 WHERE id = ?;");
+        QTest::newRow("failed image write") << "INSERT ON image" << "1|1|old|1" << failure(function, "Failed to execute "
+                "m_imageUpdate.", "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) VALUES (?, ?, ?, ?, ?);");
+    }
+
+    void step()
+    {
+        QFETCH(QString, damage);
+        QFETCH(QString, image);
+        QFETCH(QStringList, warnings);
+        const QString path = m_dir + "/picture.jpg";
+        if (damage == "corrupt")
+            QVERIFY(write(path, QByteArray(2048, 'x')));
+        else if (damage == "fifo")
+            QVERIFY(::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
+        else if (damage != "vanished")
+            QVERIFY(writeJpeg(path, { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00", "set Xmp.tiff.Orientation 3",
+                                      "set Exif.Image.Orientation 6" }));
+        m_sql.exec({ QString("INSERT INTO file (id, directoryId, mimeType, fileName, permissions, metadataCurrent) "
+                              "VALUES (1, %1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
+                      "INSERT INTO image VALUES (1, 'old', 1, 1, 1);" });
+        if (damage.contains(" ON "))
+            m_sql.exec(QString("CREATE TRIGGER refuse BEFORE %1 BEGIN SELECT RAISE(ABORT, 'no'); END;").arg(damage));
+
+        MessageLog log(false);
+        ImageManager manager(DbManager::instance());
+        QVERIFY(!manager.updateMetaData());
+        compareWarnings(log, warnings);
+        QCOMPARE(m_sql.rows("SELECT width, height, dateTaken, orientation FROM image;"), QStringList { image });
+        QCOMPARE(stale(), warnings.isEmpty() ? 0 : 1);
+        QCOMPARE(SignalRecorder::calls(), warnings.isEmpty() ? QList<int> { 2 } : QList<int>());
+    }
+
+    void batches_data()
+    {
+        QTest::addColumn<int>("count");
+        QTest::addColumn<QList<int>>("marked"); // made current by each step; a full batch asks for more
+
+        QTest::newRow("99") << 99 << QList<int> { 99 };
+        QTest::newRow("100") << 100 << QList<int> { 100, 0 };
+        QTest::newRow("101") << 101 << QList<int> { 100, 1 };
+    }
+
+    void batches()
+    {
+        QFETCH(int, count);
+        QFETCH(QList<int>, marked);
+        QVERIFY(writeJpeg(m_dir + "/0.jpg"));
+        for (int i = 1; i <= count; ++i)
+            QVERIFY(QFile::copy(m_dir + "/0.jpg", m_dir + QString("/%1.jpg").arg(i)));
+        // Never selected: no "image/" in front (GLOB is case-sensitive), or current already.
+        m_sql.exec({ QString("WITH RECURSIVE n(i) AS (SELECT 1 UNION ALL SELECT i + 1 FROM n WHERE i < %1) ").arg(count)
+                              + s_insert + "SELECT 1, 'image/jpeg', i || '.jpg', 3, 0 FROM n;",
+                      s_insert + "VALUES (1, 'audio/ogg', 'a', 3, 0), (1, 'imagejpeg', 'b', 3, 0), (1, 'image', 'c', 3, 0),"
+                                 " (1, 'application/image', 'd', 3, 0), (1, 'Image/jpeg', 'e', 3, 0), (1, 'image/png', 'f', 3, 1);" });
+
+        ImageManager manager(DbManager::instance());
+        QList<int> calls;
+        for (int step : marked) {
+            const int before = stale();
+            QCOMPARE(manager.updateMetaData(), step == 100);
+            QCOMPARE(before - stale(), step);
+            calls << QList<int> { 2 }.mid(0, step ? 1 : 0);
+            QCOMPARE(SignalRecorder::calls(), calls);
+        }
+        QCOMPARE(stale(), 5);
+        QCOMPARE(m_sql.value("SELECT COUNT(*) FROM image WHERE width = 64 AND height = 48;").toInt(), count);
+    }
+};
 
 QTEST_GUILESS_MAIN(TestImageManager)
 #include "tst_imagemanager.moc"

@@ -1,12 +1,9 @@
-#include "messagelog.h"
-#include "packagefixture.h"
-#include "signalrecorder.h"
+#include "indexfixture.h"
 #include "sysroot.h"
 
-#include <memory>
 #include <sys/stat.h>
 
-using namespace PackageFixture;
+using namespace Fixture;
 
 // Tone packs under the sounds install directory, each with `tones.index`
 // describing its `tones/` directory, read by the install loop alone.
@@ -14,118 +11,112 @@ class tst_IndexManager : public QObject
 {
     Q_OBJECT
 
-private slots:
-    void initTestCase();
-    void merge_data();
-    void merge();
-    void changeNotices();
+    TestDatabase m_db { serviceIndex() };
 
-private:
     static QString pack() { return uniquePath(InstallManager::installPaths().at(1)); }
     static QString tones() { return pack() + QStringLiteral("/tones"); }
     static bool runWith(const QByteArray &content)
     {
-        installer()->appendDirectory(InstallManager::installPaths().at(1));
-        return write(tones() + QStringLiteral(".index"), content) && waitIdle();
+        return write(tones() + QStringLiteral(".index"), content) && installFrom(InstallManager::installPaths().at(1));
     }
 
-    std::unique_ptr<TestDatabase> m_db;
+private slots:
+    void initTestCase()
+    {
+        const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
+        QVERIFY(QDir().mkpath(translations));
+        for (const char *catalog : { "tones.qm", "tones-fi.qm", "tones_eng_en.qm" })
+            QVERIFY(QFile::copy(QStringLiteral(CATALOG_DIR "/") + catalog, translations + catalog));
+        QVERIFY(installer());
+    }
+
+    void merge_data()
+    {
+        QTest::addColumn<QByteArrayList>("indexes"); // read in turn
+        QTest::addColumn<QStringList>("expected");   // the last column: a row made after the first index
+        QTest::addColumn<QStringList>("warnings");   // "%1" the index file
+        QTest::addColumn<QString>("locale");
+        const auto add = [](const char *tag, const QByteArrayList &indexes, const QStringList &expected,
+                            const QStringList &warnings = {}, const char *locale = "C") {
+            QTest::newRow(tag) << indexes << expected << warnings << QString(locale);
+        };
+        const QByteArray ab = R"({"files": [{"fileName": "a.ogg", "displayName": "A", "category": "x"}, )"
+                              R"({"fileName": "b.ogg", "displayName": "B", "category": "x"}]})";
+        const QByteArray a = R"({"files": [{"fileName": "a.ogg", "displayName": "A", "category": "x"}]})";
+        const QByteArray c = R"({"files": [{"fileName": "c.ogg", "displayName": "C", "category": "x"}]})";
+        // tone-a is in every catalogue, tone-b only in the engineering one, tone-c
+        // in none, and tone-e has an empty translation but for engineering.
+        const QByteArray translated = R"({"translationCatalog": "tones", "files": [{"fileName": "a.ogg", "displayName": "tone-a"}, )"
+            R"({"fileName": "b.ogg", "displayName": "tone-b"}, {"fileName": "c.ogg", "displayName": "tone-c"}, )"
+            R"({"fileName": "e.ogg", "displayName": "tone-e"}]})";
+        const QStringList others { "b.ogg|Engineering B|NULL|0", "c.ogg|tone-c|NULL|0", "e.ogg|Engineering E|NULL|0" };
+        add("no locale catalogue in C", { translated }, QStringList("a.ogg|Engineering A|NULL|0") + others);
+        add("locale catalogue", { translated }, QStringList("a.ogg|Suomi A|NULL|0") + others, {}, "fi_FI");
+        // Wrong types count as absent; "a.ogg" and "./a.ogg" are names, not rows.
+        add("skipped elements", { R"({"files": [{"fileName": "b.ogg", "displayName": "B", "category": "x", "more": 1}, 7, )"
+            R"("a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"}, )"
+            R"({"fileName": "a.ogg", "displayName": 5, "category": ["x"]}]})" }, { "a.ogg|NULL|NULL|0", "b.ogg|B|x|0" });
+        add("duplicate", { R"({"files": [{"fileName": "c.ogg"}, {"fileName": "a.ogg"}, {"fileName": "c.ogg"}]})" },
+            { "a.ogg|NULL|NULL|0", "c.ogg|NULL|NULL|0" },
+            { "virtual bool IndexManager::updateMetaData()", "Duplicate fileName in .index file \"c.ogg\"" });
+        add("alias keeps the row", { ab, R"({"files": [{"fileName": "a.ogg", "displayName": "A", "category": "x"}, )"
+            R"({"fileName": "c.ogg", "displayName": "B", "category": "x", "aliases": ["", 3, "b.ogg", "gone.ogg"]}]})" },
+            { "a.ogg|A|x|0", "c.ogg|B|x|0" });
+        add("changed and unnamed", { ab, R"({"files": [{"fileName": "b.ogg", "displayName": "B2", "category": "y"}]})" },
+            { "b.ogg|B2|y|0" });
+        add("empty files", { ab, R"({"files": []})" }, {});
+        // A row behind the last entry, in hand when that entry is inserted, is
+        // neither compared nor deleted in that pass: it goes in the next one.
+        add("gap row stays", { c, a }, { "a.ogg|A|x|1", "c.ogg|C|x|0" });
+        add("gap row goes next", { c, a, a }, { "a.ogg|A|x|1" });
+        // A bad index leaves the rows of its directory as they are.
+        add("root array", { ab, R"([{"fileName": "b.ogg"}])" }, { "a.ogg|A|x|0", "b.ogg|B|x|0" },
+            { "Error parsing index from file \"%1\" , offset: 0 , errorString: \"no error occurred\"" });
+    }
+
+    void merge()
+    {
+        QFETCH(QByteArrayList, indexes);
+        QFETCH(QStringList, expected);
+        QFETCH(QStringList, warnings);
+        QFETCH(QString, locale);
+
+        QLocale::setDefault(QLocale(locale));
+        QVERIFY(writeTree(tones(), { "a.ogg", "b.ogg", "c.ogg", "e.ogg" }));
+        MessageLog log(false);
+        QVERIFY(runWith(indexes.first()));
+        const QString firstMax = m_db.value(QStringLiteral("SELECT max(id) FROM file")).toString();
+        for (const QByteArray &index : indexes.mid(1))
+            QVERIFY(runWith(index));
+
+        QCOMPARE(log.warnings(), warnings.replaceInStrings("%1", tones() + QStringLiteral(".index")));
+        QCOMPARE(m_db.fileRows(tones(), QStringLiteral("fileName, displayName, category, id > %1").arg(firstMax)), expected);
+        QCOMPARE(m_db.fileRows(tones(), "permissions, mimeType").removeAll("1|audio/ogg"), expected.size());
+        // Below the package, so that the next start scans it; described by the index alone.
+        QCOMPARE(m_db.rows(QStringLiteral("SELECT scope, parentId = (SELECT id FROM directory WHERE path = '%1') FROM directory "
+                                          "WHERE path = '%2'").arg(pack(), tones())), QStringList { "3|1" });
+        // Read, and not tried again even when bad.
+        QCOMPARE(m_db.fileRows(pack(), "metadataCurrent"), QStringList { "1" });
+    }
+
+    void changeNotices()
+    {
+        const QString index = tones() + QStringLiteral(".index");
+        QVERIFY(write(tones() + QStringLiteral("/a.ogg")) && runWith(R"({"files": [{"fileName": "a.ogg"}]})"));
+        const QString markStale = QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE directoryId = %1").arg(m_db.directoryId(pack()));
+        ContentManager *indexes = ContentManager::managerFromType(7);
+
+        // A notice only when rows change, one file a call; a FIFO is passed over, not waited for.
+        SignalRecorder::clear();
+        QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
+        QCOMPARE(SignalRecorder::calls(), QList<int>());
+        QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db.exec(markStale));
+        QVERIFY(indexes->updateMetaData() && !indexes->updateMetaData());
+        QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
+        QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
+        QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
+    }
 };
-
-void tst_IndexManager::initTestCase()
-{
-    const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
-    QVERIFY(QDir().mkpath(translations));
-    for (const char *catalog : { "tones.qm", "tones-fi.qm", "tones_eng_en.qm" })
-        QVERIFY(QFile::copy(QStringLiteral(CATALOG_DIR "/") + catalog, translations + catalog));
-    QVERIFY(installer());
-    m_db = std::make_unique<TestDatabase>();
-}
-
-void tst_IndexManager::merge_data()
-{
-    QTest::addColumn<QString>("locale");
-    QTest::addColumn<QByteArrayList>("indexes"); // read in turn
-    QTest::addColumn<QStringList>("warnings"); // "%1" the index file
-    QTest::addColumn<QStringList>("expected"); // the last column: a row made after the first index
-
-    const QByteArray ab = R"({"files": [{"fileName": "a.ogg", "displayName": "A", "category": "x"},
-                                        {"fileName": "b.ogg", "displayName": "B", "category": "x"}]})";
-    const QByteArray a = R"({"files": [{"fileName": "a.ogg", "displayName": "A", "category": "x"}]})";
-    const QByteArray c = R"({"files": [{"fileName": "c.ogg", "displayName": "C", "category": "x"}]})";
-    // tone-a is in every catalogue, tone-b only in the engineering one, tone-c
-    // in none, and tone-e has an empty translation but for engineering.
-    const QByteArray translated = R"({"translationCatalog": "tones", "files": [{"fileName": "a.ogg", "displayName": "tone-a"},
-        {"fileName": "b.ogg", "displayName": "tone-b"}, {"fileName": "c.ogg", "displayName": "tone-c"},
-        {"fileName": "e.ogg", "displayName": "tone-e"}]})";
-    const QStringList others { "b.ogg|Engineering B|NULL|0", "c.ogg|tone-c|NULL|0", "e.ogg|Engineering E|NULL|0" };
-    QTest::newRow("no locale catalogue in C") << "C" << QByteArrayList { translated } << QStringList() << QStringList("a.ogg|Engineering A|NULL|0") + others;
-    QTest::newRow("locale catalogue") << "fi_FI" << QByteArrayList { translated } << QStringList() << QStringList("a.ogg|Suomi A|NULL|0") + others;
-    // Wrong types count as absent; "a.ogg" and "./a.ogg" are names, not rows.
-    QTest::newRow("skipped elements") << "C" << QByteArrayList { R"({"files": [{"fileName": "b.ogg", "displayName": "B",
-        "category": "x", "more": 1}, 7, "a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"},
-        {"fileName": "a.ogg", "displayName": 5, "category": ["x"]}]})" } << QStringList() << QStringList { "a.ogg|NULL|NULL|0", "b.ogg|B|x|0" };
-    QTest::newRow("duplicate") << "C" << QByteArrayList { R"({"files": [{"fileName": "c.ogg"}, {"fileName": "a.ogg"}, {"fileName": "c.ogg"}]})" }
-            << QStringList { "virtual bool IndexManager::updateMetaData()", "Duplicate fileName in .index file \"c.ogg\"" }
-            << QStringList { "a.ogg|NULL|NULL|0", "c.ogg|NULL|NULL|0" };
-    QTest::newRow("alias keeps the row") << "C" << QByteArrayList { ab, R"({"files": [{"fileName": "a.ogg", "displayName": "A",
-        "category": "x"}, {"fileName": "c.ogg", "displayName": "B", "category": "x", "aliases": ["", 3, "b.ogg", "gone.ogg"]}]})" }
-            << QStringList() << QStringList { "a.ogg|A|x|0", "c.ogg|B|x|0" };
-    QTest::newRow("changed and unnamed") << "C" << QByteArrayList { ab, R"({"files": [{"fileName": "b.ogg", "displayName": "B2",
-        "category": "y"}]})" } << QStringList() << QStringList { "b.ogg|B2|y|0" };
-    QTest::newRow("empty files") << "C" << QByteArrayList { ab, R"({"files": []})" } << QStringList() << QStringList();
-    // A row behind the last entry, in hand when that entry is inserted, is
-    // neither compared nor deleted in that pass: it goes in the next one.
-    QTest::newRow("gap row stays") << "C" << QByteArrayList { c, a } << QStringList() << QStringList { "a.ogg|A|x|1", "c.ogg|C|x|0" };
-    QTest::newRow("gap row goes next") << "C" << QByteArrayList { c, a, a } << QStringList() << QStringList { "a.ogg|A|x|1" };
-    // A bad index leaves the rows of its directory as they are.
-    QTest::newRow("root array") << "C" << QByteArrayList { ab, R"([{"fileName": "b.ogg"}])" }
-            << QStringList { "Error parsing index from file \"%1\" , offset: 0 , errorString: \"no error occurred\"" }
-            << QStringList { "a.ogg|A|x|0", "b.ogg|B|x|0" };
-}
-
-void tst_IndexManager::merge()
-{
-    QFETCH(QString, locale);
-    QFETCH(QByteArrayList, indexes);
-    QFETCH(QStringList, warnings);
-    QFETCH(QStringList, expected);
-
-    QLocale::setDefault(QLocale(locale));
-    QVERIFY(writeTree(tones(), { "a.ogg", "b.ogg", "c.ogg", "e.ogg" }));
-    MessageLog log(false);
-    QVERIFY(runWith(indexes.first()));
-    const QString firstMax = m_db->value(QStringLiteral("SELECT max(id) FROM file")).toString();
-    for (const QByteArray &index : indexes.mid(1))
-        QVERIFY(runWith(index));
-
-    QCOMPARE(log.warnings(), warnings.replaceInStrings("%1", tones() + QStringLiteral(".index")));
-    QCOMPARE(fileRows(*m_db, tones(), QStringLiteral("fileName, displayName, category, id > %1").arg(firstMax)), expected);
-    QCOMPARE(fileRows(*m_db, tones(), "permissions, mimeType").removeAll("1|audio/ogg"), expected.size());
-    // Below the package, so that the next start scans it; described by the index alone.
-    QCOMPARE(m_db->rows(QStringLiteral("SELECT scope, parentId = (SELECT id FROM directory WHERE path = '%1') FROM directory "
-                                       "WHERE path = '%2'").arg(pack(), tones())), QStringList { "3|1" });
-    // Read, and not tried again even when bad.
-    QCOMPARE(fileRows(*m_db, pack(), "metadataCurrent"), QStringList { "1" });
-}
-
-void tst_IndexManager::changeNotices()
-{
-    const QString index = tones() + QStringLiteral(".index");
-    QVERIFY(write(tones() + QStringLiteral("/a.ogg")) && runWith(R"({"files": [{"fileName": "a.ogg"}]})"));
-    const QString markStale = QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE directoryId = %1").arg(directoryId(*m_db, pack()));
-    ContentManager *indexes = ContentManager::managerFromType(7);
-
-    // A notice only when rows change, one file a call; a FIFO is passed over, not waited for.
-    SignalRecorder::clear();
-    QVERIFY(m_db->exec(markStale) && indexes->updateMetaData());
-    QCOMPARE(SignalRecorder::calls(), QList<int>());
-    QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db->exec(markStale));
-    QVERIFY(indexes->updateMetaData() && !indexes->updateMetaData());
-    QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
-    QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
-    QVERIFY(m_db->exec(markStale) && indexes->updateMetaData());
-}
 
 QTEST_GUILESS_MAIN(tst_IndexManager)
 #include "tst_indexmanager.moc"

@@ -1,165 +1,149 @@
-#include "messagelog.h"
-#include "packagefixture.h"
+#include "indexfixture.h"
 
-#include <memory>
 #include <sys/stat.h>
 
-using namespace PackageFixture;
+using namespace Fixture;
 
 class tst_InstallManager : public QObject
 {
     Q_OBJECT
 
+    TestDatabase m_db { serviceIndex() };
+
 private slots:
-    void initTestCase() { QVERIFY(installer()); m_db = std::make_unique<TestDatabase>(); }
-    void packageRoad();
-    void scanMerge();
-    void install();
-    void setFavorite();
-    void manyPackages();
+    void initTestCase() { QVERIFY(installer()); }
 
-private:
-    static QString testPath() { return uniquePath(qEnvironmentVariable("THEMELET_SANDBOX") + QStringLiteral("/packages")); }
+    void packageRoad()
+    {
+        const QString installDir = InstallManager::installPaths().at(0), package = installDir + "/sunset";
+        const QByteArray themelet = R"({"wallpaper": "sunset.jpg", "displayName": "Sunset", )"
+                                    R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})";
+        QVERIFY(writeTree(package, { "images/sunset.jpg", "images/dawn.jpg", "sounds/dusk.ogg" }, "x"));
+        QVERIFY(write(package + "/sunset.themelet", themelet));
 
-    std::unique_ptr<TestDatabase> m_db;
+        // What the service does at its start; the loops do the rest.
+        for (const QString &path : InstallManager::installPaths())
+            installer()->appendDirectory(path);
+        QVERIFY(waitIdle());
+        const QString fileId = m_db.fileRows(package, "file.id").value(0);
+        const QString state = QStringLiteral("SELECT permissions, mimeType, metadataCurrent, displayName, scope, parentId = %1, "
+                                             "homeWallpaper, resourceType, (SELECT fileName FROM file WHERE id = resourceId) FROM file "
+                                             "JOIN directory ON directory.id = directoryId JOIN themelet ON fileId = file.id "
+                                             "JOIN resource USING (fileId) WHERE file.id = %2").arg(m_db.directoryId(installDir), fileId);
+        const QString read = "1|application/x-vorka-themelet|1|%1|2|1|" + package + "/images/%2.jpg|ringerToneFile|dusk.ogg";
+        QCOMPARE(m_db.rows(state), QStringList { read.arg("Sunset", "sunset") });
+
+        // A changed file is read again at the next install, into the same rows.
+        QVERIFY(write(package + "/sunset.themelet", QByteArray(themelet).replace("Sunset", "Dawn").replace("sunset", "dawn")));
+        QVERIFY(installFrom(installDir));
+        QCOMPARE(m_db.rows(state), QStringList { read.arg("Dawn", "dawn") });
+
+        // A package that is gone takes its rows along, by the triggers.
+        QVERIFY(QDir(package).removeRecursively() && installFrom(installDir) && m_db.directoryId(package).isEmpty());
+        QCOMPARE(m_db.value(QStringLiteral("SELECT (SELECT count(*) FROM file WHERE id = %1) + (SELECT count(*) FROM themelet WHERE "
+                                           "fileId = %1) + (SELECT count(*) FROM resource WHERE fileId = %1)").arg(fileId)).toInt(), 0);
+    }
+
+    void scanMerge()
+    {
+        // Packages a, b and r on disk; rows b, c, y and z as an earlier run left
+        // them, and r known as a root of its own, which is adopted with its id.
+        const QString installDir = uniquePath();
+        QVERIFY(writeTree(installDir, { "a/a.index", "b/b.index", "r/r.index" }, "{}"));
+        QVERIFY(m_db.exec(QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 1), ('%1/r', 0)").arg(installDir)));
+        const QString parentId = m_db.directoryId(installDir);
+        QVERIFY(m_db.exec(QStringLiteral("INSERT INTO directory (parentId, path, scope) SELECT %1, '%2/' || column1, 2 "
+                                         "FROM (VALUES ('b'), ('c'), ('y'), ('z'))").arg(parentId, installDir)));
+        const QString knownIds = QStringLiteral("SELECT id FROM directory WHERE path IN ('%1/b', '%1/r') ORDER BY path").arg(installDir);
+        const QStringList ids = m_db.rows(knownIds);
+        const QString children = QStringLiteral("SELECT substr(path, %1), scope, (SELECT count(*) FROM file WHERE directoryId = "
+                                                "directory.id) FROM directory WHERE parentId = %2 ORDER BY path")
+                                         .arg(installDir.size() + 2).arg(parentId);
+
+        // New r uses up the list in front of row y, which is left for the next
+        // scan; z, behind it, goes at once. Every package is installed, new or known.
+        QVERIFY(installFrom(installDir));
+        QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1", "y|2|0" }));
+        QCOMPARE(m_db.rows(knownIds), ids);
+        QVERIFY(installFrom(installDir));
+        QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1" }));
+    }
+
+    void install()
+    {
+        // Only .themelet and .index files right in the package count, by a case-sensitive suffix.
+        const QString package = uniquePath();
+        QVERIFY(writeTree(package, { "t1.themelet", "t2.themelet", "tones.index", "x.THEMELET", "c.index.txt", ".h.themelet",
+                                     "y.themelet/z.index", "images/readme" }, "{}"));
+        QVERIFY(installer()->install(package + "/images", QString(), false) && m_db.fileRows(package + "/images", "id").isEmpty());
+        QVERIFY(!installer()->install(package + "/none", QString(), false) && installer()->install(package, QString(), false));
+        const QString columns = QStringLiteral("fileName, permissions, metadataCurrent, zefId");
+        QCOMPARE(m_db.fileRows(package, columns + ", mimeType"), (QStringList { "t1.themelet|1|0|NULL|application/x-vorka-themelet",
+                "t2.themelet|1|0|NULL|application/x-vorka-themelet", "tones.index|1|0|NULL|application/x-vorka-index" }));
+        const QStringList ids = m_db.fileRows(package, "id");
+        QVERIFY(waitIdle());
+        // As if read, and as if a writable row had been left behind.
+        const QString markRead = "UPDATE file SET metadataCurrent = 1, permissions = 3 WHERE directoryId = " + m_db.directoryId(package);
+
+        // Unchanged: nothing to update, but the ZEF id is bound; an empty one keeps it.
+        QVERIFY(m_db.exec(markRead) && installer()->install(package, QStringLiteral("Z1"), false));
+        QVERIFY(write(package + QStringLiteral("/t2.themelet"), "{}") && installer()->install(package, QString(), false));
+        QCOMPARE(m_db.fileRows(package, columns), (QStringList { "t1.themelet|3|1|Z1", "t2.themelet|1|0|Z1", "tones.index|3|1|NULL" }));
+        QCOMPARE(m_db.fileRows(package, "modificationTime").value(1),
+                 QFileInfo(package + QStringLiteral("/t2.themelet")).lastModified().toString(Qt::ISODateWithMs));
+
+        QVERIFY(m_db.exec(markRead) && installer()->install(package, QStringLiteral("Z2"), true));
+        QCOMPARE(m_db.fileRows(package, columns), (QStringList { "t1.themelet|1|0|Z2", "t2.themelet|1|0|Z2", "tones.index|1|0|NULL" }));
+        QVERIFY(m_db.fileRows(package, "id") == ids && waitIdle());
+    }
+
+    void setFavorite()
+    {
+        QVERIFY(m_db.exec("INSERT INTO themelet (fileId, homeWallpaper) VALUES (-1, '/w/shared.jpg'), (-2, '/w/shared.jpg'), "
+                          "(-3, '/w/other.jpg')"));
+        const QString favorites = "SELECT group_concat(favorite, '') FROM (SELECT favorite FROM themelet WHERE fileId < 0 "
+                                  "ORDER BY fileId DESC)";
+
+        MessageLog log(false);
+        QVERIFY(installer()->setFavorite("/w/shared.jpg", true) && !installer()->setFavorite("/w/none.jpg", true));
+        QCOMPARE(m_db.value(favorites).toString(), "110");
+        QCOMPARE(log.warnings(), (QStringList { "bool InstallManager::setFavorite(const QString&, bool)",
+                                                "No themelet found with url '/w/none.jpg'" }));
+    }
+
+    void manyPackages()
+    {
+        // Each with an index but no directory for it to describe; also a name that
+        // isn't UTF-8, a broken index, and a package that vanishes while queued.
+        const QString installDir = uniquePath(), vanishing = installDir + QStringLiteral("/p0999");
+        const int count = 1000;
+        for (int i = 0; i < count; ++i)
+            QVERIFY(write(installDir + QStringLiteral("/p%1/p.index").arg(i, 4, 10, QLatin1Char('0')), "{}"));
+        QVERIFY(::mkdir((QFile::encodeName(installDir) + "/bad\xff\xfe").constData(), 0755) == 0);
+        QVERIFY(write(installDir + QStringLiteral("/broken/broken.index"), "{\"files\": ["));
+
+        // One package a step: a timer gets its turn between any two packages, and
+        // a queued package can vanish before its turn comes.
+        const QString installed = QStringLiteral("SELECT count(*) FROM file WHERE fileName = 'p.index'");
+        QSet<int> seenByTimer;
+        QTimer timer;
+        connect(&timer, &QTimer::timeout, this, [&] {
+            seenByTimer.insert(m_db.value(installed).toInt());
+            if (QFile::exists(vanishing) && !m_db.directoryId(vanishing).isEmpty())
+                QDir(vanishing).removeRecursively();
+        });
+        timer.start(0);
+        QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^Error parsing index from file .*broken.index"));
+        QVERIFY(installFrom(installDir));
+        timer.stop();
+
+        QVERIFY2(seenByTimer.size() > count / 2, qPrintable(QString::number(seenByTimer.size())));
+        QCOMPARE(m_db.value(installed).toInt(), count - 1);
+        // Each index read once, the broken one too, and no directory made for it.
+        QCOMPARE(m_db.rows("SELECT (SELECT count(*) FROM file WHERE mimeType = 'application/x-vorka-index' AND metadataCurrent = 0), "
+                           "(SELECT count(*) FROM directory WHERE path LIKE '%/p')"), QStringList { "0|0" });
+    }
 };
-
-void tst_InstallManager::packageRoad()
-{
-    const QString installDir = InstallManager::installPaths().at(0), package = installDir + QStringLiteral("/sunset");
-    const QByteArray themelet = R"({"wallpaper": "sunset.jpg", "displayName": "Sunset", "ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})";
-    QVERIFY(writeTree(package, { "images/sunset.jpg", "images/dawn.jpg", "sounds/dusk.ogg" }, "x") && write(package + "/sunset.themelet", themelet));
-
-    // What the service does at its start; the loops do the rest.
-    for (const QString &path : InstallManager::installPaths())
-        installer()->appendDirectory(path);
-    QVERIFY(waitIdle());
-    const QString fileId = fileRows(*m_db, package, "file.id").value(0);
-    const QString state = QStringLiteral("SELECT permissions, mimeType, metadataCurrent, displayName, scope, parentId = %1, homeWallpaper, "
-                                         "resourceType, (SELECT fileName FROM file WHERE id = resourceId) FROM file JOIN directory ON "
-                                         "directory.id = directoryId JOIN themelet ON fileId = file.id JOIN resource USING (fileId) "
-                                         "WHERE file.id = %2").arg(directoryId(*m_db, installDir), fileId);
-    QCOMPARE(m_db->rows(state), QStringList("1|application/x-vorka-themelet|1|Sunset|2|1|" + package + "/images/sunset.jpg|ringerToneFile|dusk.ogg"));
-
-    // A changed file is read again at the next install, into the same rows.
-    QVERIFY(write(package + QStringLiteral("/sunset.themelet"), QByteArray(themelet).replace("Sunset", "Dawn").replace("sunset", "dawn")));
-    installer()->appendDirectory(installDir);
-    QVERIFY(waitIdle());
-    QCOMPARE(m_db->rows(state), QStringList("1|application/x-vorka-themelet|1|Dawn|2|1|" + package + "/images/dawn.jpg|ringerToneFile|dusk.ogg"));
-
-    // A package that is gone takes its rows along, by the triggers.
-    QVERIFY(QDir(package).removeRecursively());
-    installer()->appendDirectory(installDir);
-    QVERIFY(waitIdle() && directoryId(*m_db, package).isEmpty());
-    QCOMPARE(m_db->value(QStringLiteral("SELECT (SELECT count(*) FROM file WHERE id = %1) + (SELECT count(*) FROM themelet "
-                                        "WHERE fileId = %1) + (SELECT count(*) FROM resource WHERE fileId = %1)").arg(fileId)).toInt(), 0);
-}
-
-void tst_InstallManager::scanMerge()
-{
-    // Packages a, b and r on disk; rows b, c, y and z as an earlier run left
-    // them, and r known as a root of its own, which is adopted with its id.
-    const QString installDir = testPath();
-    QVERIFY(writeTree(installDir, { "a/a.index", "b/b.index", "r/r.index" }, "{}"));
-    QVERIFY(m_db->exec(QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 1), ('%1/r', 0)").arg(installDir)));
-    const QString parentId = directoryId(*m_db, installDir);
-    for (const char *name : { "b", "c", "y", "z" })
-        QVERIFY(m_db->exec(QStringLiteral("INSERT INTO directory (parentId, path, scope) VALUES (%1, '%2/%3', 2)").arg(parentId, installDir, name)));
-    const QString knownIds = QStringLiteral("SELECT id FROM directory WHERE path IN ('%1/b', '%1/r') ORDER BY path").arg(installDir);
-    const QStringList ids = m_db->rows(knownIds);
-    const QString children = QStringLiteral("SELECT substr(path, %1), scope FROM directory WHERE parentId = %2 ORDER BY path")
-                                     .arg(installDir.size() + 2).arg(parentId);
-
-    // New r uses up the list in front of row y, which is left for the next
-    // scan; z, behind it, goes at once. Every package is installed, new or known.
-    installer()->appendDirectory(installDir);
-    QVERIFY(waitIdle());
-    QCOMPARE(m_db->rows(children), (QStringList { "a|2", "b|2", "r|2", "y|2" }));
-    QCOMPARE(m_db->rows(knownIds), ids);
-    QCOMPARE(m_db->value(QStringLiteral("SELECT count(*) FROM file JOIN directory ON directory.id = directoryId WHERE parentId = %1")
-                                 .arg(parentId)).toInt(), 3);
-    installer()->appendDirectory(installDir);
-    QVERIFY(waitIdle());
-    QCOMPARE(m_db->rows(children), (QStringList { "a|2", "b|2", "r|2" }));
-}
-
-void tst_InstallManager::install()
-{
-    // Only .themelet and .index files right in the package count, by a case-sensitive suffix.
-    const QString package = testPath();
-    QVERIFY(writeTree(package, { "t1.themelet", "t2.themelet", "tones.index", "x.THEMELET", "c.index.txt", ".h.themelet",
-                                 "y.themelet/z.index", "images/readme" }, "{}"));
-    QVERIFY(installer()->install(package + "/images", QString(), false) && fileRows(*m_db, package + "/images", "id").isEmpty());
-    QVERIFY(!installer()->install(package + QStringLiteral("/none"), QString(), false));
-    QVERIFY(installer()->install(package, QString(), false));
-    const QString columns = QStringLiteral("fileName, permissions, metadataCurrent, zefId");
-    QCOMPARE(fileRows(*m_db, package, columns + ", mimeType"), (QStringList { "t1.themelet|1|0|NULL|application/x-vorka-themelet",
-            "t2.themelet|1|0|NULL|application/x-vorka-themelet", "tones.index|1|0|NULL|application/x-vorka-index" }));
-    const QStringList ids = fileRows(*m_db, package, "id");
-    QVERIFY(waitIdle());
-    // As if read, and as if a writable row had been left behind.
-    const QString markRead = QStringLiteral("UPDATE file SET metadataCurrent = 1, permissions = 3 WHERE directoryId = %1")
-                                     .arg(directoryId(*m_db, package));
-
-    // Unchanged: nothing to update, but the ZEF id is bound; an empty one keeps it.
-    QVERIFY(m_db->exec(markRead) && installer()->install(package, QStringLiteral("Z1"), false));
-    QVERIFY(write(package + QStringLiteral("/t2.themelet"), "{}") && installer()->install(package, QString(), false));
-    QCOMPARE(fileRows(*m_db, package, columns), (QStringList { "t1.themelet|3|1|Z1", "t2.themelet|1|0|Z1", "tones.index|3|1|NULL" }));
-    QCOMPARE(fileRows(*m_db, package, "modificationTime").value(1),
-             QFileInfo(package + QStringLiteral("/t2.themelet")).lastModified().toString(Qt::ISODateWithMs));
-
-    QVERIFY(m_db->exec(markRead) && installer()->install(package, QStringLiteral("Z2"), true));
-    QCOMPARE(fileRows(*m_db, package, columns), (QStringList { "t1.themelet|1|0|Z2", "t2.themelet|1|0|Z2", "tones.index|1|0|NULL" }));
-    QCOMPARE(fileRows(*m_db, package, "id"), ids);
-    QVERIFY(waitIdle());
-}
-
-void tst_InstallManager::setFavorite()
-{
-    QVERIFY(m_db->exec("INSERT INTO themelet (fileId, homeWallpaper) VALUES (-1, '/w/shared.jpg'), (-2, '/w/shared.jpg'), (-3, '/w/other.jpg')"));
-    const QString favorites = QStringLiteral("SELECT group_concat(favorite, '') FROM (SELECT favorite FROM themelet WHERE fileId < 0 ORDER BY fileId DESC)");
-
-    QVERIFY(installer()->setFavorite("/w/shared.jpg", true));
-    QCOMPARE(m_db->value(favorites).toString(), "110");
-    MessageLog log(false);
-    QVERIFY(!installer()->setFavorite("/w/none.jpg", true));
-    QCOMPARE(log.warnings(), (QStringList { "bool InstallManager::setFavorite(const QString&, bool)", "No themelet found with url '/w/none.jpg'" }));
-    QCOMPARE(m_db->value(favorites).toString(), "110");
-}
-
-void tst_InstallManager::manyPackages()
-{
-    // Each with an index but no directory for it to describe; also a name that
-    // isn't UTF-8, a broken index, and a package that vanishes while queued.
-    const QString installDir = testPath(), vanishing = installDir + QStringLiteral("/p0999");
-    const int count = 1000;
-    for (int i = 0; i < count; ++i)
-        QVERIFY(write(installDir + QStringLiteral("/p%1/p.index").arg(i, 4, 10, QLatin1Char('0')), "{}"));
-    QVERIFY(::mkdir((QFile::encodeName(installDir) + "/bad\xff\xfe").constData(), 0755) == 0);
-    QVERIFY(write(installDir + QStringLiteral("/broken/broken.index"), "{\"files\": ["));
-
-    // One package a step: a timer gets its turn between any two packages, and
-    // a queued package can vanish before its turn comes.
-    const QString installed = QStringLiteral("SELECT count(*) FROM file WHERE fileName = 'p.index'");
-    QSet<int> seenByTimer;
-    QTimer timer;
-    connect(&timer, &QTimer::timeout, this, [&] {
-        seenByTimer.insert(m_db->value(installed).toInt());
-        if (QFile::exists(vanishing) && !directoryId(*m_db, vanishing).isEmpty())
-            QDir(vanishing).removeRecursively();
-    });
-    timer.start(0);
-    QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^Error parsing index from file .*broken.index"));
-    installer()->appendDirectory(installDir);
-    QVERIFY(waitIdle());
-    timer.stop();
-
-    QVERIFY2(seenByTimer.size() > count / 2, qPrintable(QString::number(seenByTimer.size())));
-    QCOMPARE(m_db->value(installed).toInt(), count - 1);
-    // Each index read once, the broken one too, and no directory made for it.
-    QCOMPARE(m_db->value("SELECT count(*) FROM file WHERE mimeType = 'application/x-vorka-index' AND metadataCurrent = 0").toInt(), 0);
-    QCOMPARE(m_db->value("SELECT count(*) FROM directory WHERE path LIKE '%/p'").toInt(), 0);
-}
 
 QTEST_GUILESS_MAIN(tst_InstallManager)
 #include "tst_installmanager.moc"

@@ -1,27 +1,21 @@
-#include "contentmanager.h"
-#include "messagelog.h"
+#include "dconftest.h"
+#include "indexfixture.h"
 #include "profiledefaults.h"
-#include "signalrecorder.h"
 #include "sysroot.h"
-#include "testdatabase.h"
 #include "themeletmanager.h"
-
-#include <QtTest>
 
 #include <sys/stat.h>
 
-static const QString s_resources = QStringLiteral("SELECT resourceType, fileName FROM resource "
-                                                  "JOIN file ON resourceId = file.id ORDER BY resourceType");
+using namespace Fixture;
+
+static const QString s_resources = "SELECT resourceType, fileName FROM resource JOIN file ON resourceId = file.id ORDER BY resourceType";
+
+static const QString s_sourceKey = QStringLiteral("/desktop/lunda/background/portrait/picture_filename");
+static const QString s_applicationKey = QStringLiteral("/desktop/vorka/background/portrait/app_picture_filename");
+static const QString s_homeKey = QStringLiteral("/desktop/vorka/background/portrait/home_picture_filename");
 
 static QString package(const QString &name) { return Sysroot::path(QStringLiteral("/usr/share/themelet/")) + name; }
 static QString user(const QString &name) { return qEnvironmentVariable("THEMELET_SANDBOX") + "/user/" + name; }
-
-static void write(const QString &path, const QByteArray &content = "x")
-{
-    QDir().mkpath(QFileInfo(path).absolutePath());
-    QFile file(path);
-    QVERIFY2(file.open(QIODevice::WriteOnly) && file.write(content) == content.size(), qPrintable(path));
-}
 
 // The timestamp column as an SQL expression, "now" for a time from `since` on.
 static QString timestampSince(const QDateTime &since)
@@ -33,389 +27,369 @@ static QString timestampSince(const QDateTime &since)
 class tst_ThemeletManager : public QObject
 {
     Q_OBJECT
-private slots:
-    void initTestCase();
-    void init();
-    void sunset();
-    void translation();
-    void format_data();
-    void format();
-    void malformed_data();
-    void malformed();
-    void reread_data();
-    void reread();
-    void batchSize();
-    void save_data();
-    void save();
-    void saveResources();
-    void activeThemelet();
-    void createAndRemove();
 
-private:
-    QStringList rows(const QString &sql) { return m_db->rows(sql); }
-    QString value(const QString &sql) { return m_db->value(sql).toString(); }
+    ThemeletManager *m_manager = nullptr;
+    TestDatabase m_db { serviceIndex() };
+
     // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), unread row.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
-        for (const char *file : { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" })
-            write(package(name) + '/' + file);
+        writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
         write(package(name) + '/' + name + ".themelet", json);
-        m_db->exec({ QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 2)").arg(package(name)),
-                     QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) "
-                                    "SELECT MAX(id), 'application/x-vorka-themelet', '%1.themelet', 1, 0 "
-                                    "FROM directory").arg(name) });
+        m_db.exec({ QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 2)").arg(package(name)),
+                    QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) SELECT MAX(id), "
+                                   "'application/x-vorka-themelet', '%1.themelet', 1, 0 FROM directory").arg(name) });
         if (read) {
             m_manager->updateMetaData();
             SignalRecorder::clear();
         }
-        return value(QStringLiteral("SELECT MAX(id) FROM file WHERE fileName = '%1.themelet'").arg(name)).toLongLong();
+        return m_db.value(QStringLiteral("SELECT MAX(id) FROM file WHERE fileName = '%1.themelet'").arg(name)).toLongLong();
     }
 
-    ThemeletManager *m_manager = nullptr;
-    QScopedPointer<TestDatabase> m_db;
-};
+private slots:
+    void initTestCase()
+    {
+        QLocale::setDefault(QLocale(QStringLiteral("fi_FI")));
+        // The locale catalogue is looked up without a suffix, the engineering one with ".qm".
+        const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
+        QVERIFY(QDir().mkpath(translations));
+        QVERIFY(QFile::copy(THEMELET_TEST_CATALOGS "/themelet-sunset-fi.qm", translations + "themelet-sunset-fi"));
+        QVERIFY(QFile::copy(THEMELET_TEST_CATALOGS "/themelet-sunset_eng_en.qm", translations + "themelet-sunset_eng_en.qm"));
+        const QString ringer = Sysroot::path(QStringLiteral("/usr/share/sounds/fallback-ringer.ogg"));
+        QVERIFY(write(ringer) && write(ProfileDefaults::path(), "[fallback]\nringing.alert.tone=" + ringer.toUtf8() + '\n'));
+        QVERIFY(m_manager = static_cast<ThemeletManager *>(ContentManager::managerFromType(1)));
+    }
+    void init()
+    {
+        m_db.exec({ "DELETE FROM resource", "DELETE FROM themelet", "DELETE FROM file", "DELETE FROM directory" });
+        QVERIFY(QDir(package({})).removeRecursively() && QDir(user({})).removeRecursively());
+        SignalRecorder::clear();
+    }
 
-void tst_ThemeletManager::initTestCase()
-{
-    QLocale::setDefault(QLocale(QStringLiteral("fi_FI")));
-    const QString translations = Sysroot::path(QStringLiteral("/usr/share/translations/"));
-    QDir().mkpath(translations);
-    // The locale catalogue is looked up without a suffix, the engineering one with ".qm".
-    QFile::copy(THEMELET_TEST_CATALOGS "/themelet-sunset-fi.qm", translations + "themelet-sunset-fi");
-    QFile::copy(THEMELET_TEST_CATALOGS "/themelet-sunset_eng_en.qm", translations + "themelet-sunset_eng_en.qm");
-    const QString ringer = Sysroot::path(QStringLiteral("/usr/share/sounds/fallback-ringer.ogg"));
-    write(ringer);
-    write(ProfileDefaults::path(), "[fallback]\nringing.alert.tone=" + ringer.toUtf8() + '\n');
-    m_manager = static_cast<ThemeletManager *>(ContentManager::managerFromType(1));
-    QVERIFY(m_manager);
-    m_db.reset(new TestDatabase);
-}
+    void sunset()
+    {
+        write(package("sunset") + "/images/sunset.jpg");
+        const qint64 id = addThemelet("sunset", R"({"wallpaper": "sunset.jpg", "displayName": "themelet-la-sunset", )"
+            R"("translationCatalog": "themelet-sunset", "highlightColor": "#ffcc66", "secondaryHighlightColor": "#cc9933", )"
+            R"("primaryColor": "#ffffff", "secondaryColors": "#b0ffffff", "ringerVolume": 60, )"
+            R"("timestamp": "2014-05-01T12:00:00", "version": 2, "ringerToneFile": { "file": "dusk.ogg", "enabled": 1 }, )"
+            R"("messageToneFile": { "enabled": 0 }})");
+        QCOMPARE(m_manager->updateMetaData(), false);
+        QCOMPARE(m_db.rows("SELECT displayName, metadataCurrent, homeWallpaper, applicationWallpaper, favorite, highlightColor, "
+                           "secondaryHighlightColor, primaryColor, secondaryColor, ringerVolume, enabledSounds, timestamp, version "
+                           "FROM themelet JOIN file ON fileId = id"), QStringList { "Auringonlasku|1|" + package("sunset")
+                 + "/images/sunset.jpg|NULL|1|#ffcc66|#cc9933|#ffffff|#b0ffffff|60|-3|2014-05-01T12:00:00|2" });
+        QCOMPARE(m_db.rows(s_resources), QStringList { "ringerToneFile|dusk.ogg" });
 
-void tst_ThemeletManager::init()
-{
-    m_db->exec({ "DELETE FROM resource", "DELETE FROM themelet", "DELETE FROM file", "DELETE FROM directory" });
-    QVERIFY(QDir(package({})).removeRecursively() && QDir(user({})).removeRecursively());
-    SignalRecorder::clear();
-}
+        m_db.exec(QStringLiteral("INSERT INTO zefid (fileId, zefId) VALUES (%1, 'zef-1')").arg(id));
+        const Themelet themelet = m_manager->themeletFromZefId("zef-1");
+        QVERIFY(!themelet.isNull() && m_manager->themeletInstallDirName(themelet->url.toLocalFile()) == "sunset");
+        QCOMPARE(themelet->resources.value("ringerToneFile").toMap().value("url").toUrl().path(), package("sunset") + "/sounds/dusk.ogg");
+    }
 
-void tst_ThemeletManager::sunset()
-{
-    write(package("sunset") + "/images/sunset.jpg");
-    const qint64 id = addThemelet("sunset", R"({"wallpaper": "sunset.jpg", "displayName": "themelet-la-sunset",
-        "translationCatalog": "themelet-sunset", "highlightColor": "#ffcc66", "secondaryHighlightColor": "#cc9933",
-        "primaryColor": "#ffffff", "secondaryColors": "#b0ffffff", "ringerVolume": 60,
-        "timestamp": "2014-05-01T12:00:00", "version": 2, "ringerToneFile": { "file": "dusk.ogg", "enabled": 1 },
-        "messageToneFile": { "enabled": 0 }})");
-    QCOMPARE(m_manager->updateMetaData(), false);
-    QCOMPARE(rows("SELECT homeWallpaper, applicationWallpaper, favorite, highlightColor, secondaryHighlightColor, "
-                  "primaryColor, secondaryColor, ringerVolume, enabledSounds, timestamp, version FROM themelet"),
-             QStringList { package("sunset") + "/images/sunset.jpg|NULL|1|#ffcc66|#cc9933|#ffffff|#b0ffffff|60|-3|"
-                                               "2014-05-01T12:00:00|2" });
-    QCOMPARE(value("SELECT displayName || metadataCurrent FROM file JOIN themelet ON fileId = id"), "Auringonlasku1");
-    QCOMPARE(rows(s_resources), QStringList { "ringerToneFile|dusk.ogg" });
-
-    m_db->exec(QStringLiteral("INSERT INTO zefid (fileId, zefId) VALUES (%1, 'zef-1')").arg(id));
-    const Themelet themelet = m_manager->themeletFromZefId("zef-1");
-    QVERIFY(!themelet.isNull() && themelet->url.toLocalFile() == package("sunset") + "/sunset.themelet");
-    QCOMPARE(themelet->resources.value("ringerToneFile").toMap().value("url").toUrl().toLocalFile(),
-             package("sunset") + "/sounds/dusk.ogg");
-    QCOMPARE(m_manager->themeletInstallDirName(themelet->url.toLocalFile()), QStringLiteral("sunset"));
-}
-
-void tst_ThemeletManager::translation()
-{
-    // One batch in directory order. After a file without a catalogue the same catalogue stays off.
-    const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset" };
-    for (int i = 0; i < catalogs.size(); ++i)
-        addThemelet(QString::number(i), QStringLiteral(R"({"wallpaper": "w.jpg", "translationCatalog": "%1",
-                "displayName": "themelet-la-%2"})").arg(catalogs[i], i == 2 ? "dusk" : "sunset").toUtf8());
-    m_manager->updateMetaData();
-    QCOMPARE(rows("SELECT displayName FROM file JOIN themelet ON fileId = id ORDER BY id"), (QStringList {
-            "themelet-la-sunset", "Auringonlasku", "Dusk" /* empty in the locale catalogue */, "themelet-la-sunset",
-            "themelet-la-sunset" }));
-    // A new batch starts with nothing remembered.
-    m_db->exec("UPDATE file SET metadataCurrent = 0 WHERE fileName = '4.themelet'");
-    m_manager->updateMetaData();
-    QCOMPARE(value("SELECT displayName FROM file WHERE fileName = '4.themelet'"), "Auringonlasku");
-}
-
-void tst_ThemeletManager::format_data()
-{
-    QTest::addColumn<QByteArray>("json");
-    QTest::addColumn<QString>("row"); // favorite|ringerVolume|enabledSounds|version|highlight|partner|timestamp
-    QTest::addColumn<QStringList>("resources");
-    const auto add = [](const char *tag, const char *keys, const char *row, const QStringList &resources = {}) {
-        QTest::newRow(tag) << "{\"wallpaper\": " + QByteArray(keys) + '}' << QString(row) << resources;
-    };
-    const char *defaults = "1|80|-1|1|NULL|NULL|now";
-    add("only wallpaper", R"("w.jpg")", defaults);
-    add("slash in wallpaper", R"("images/w.jpg")", "");
-    add("missing wallpaper file", R"("gone.jpg")", "");
-    add("version as text", R"("w.jpg", "version": "3")", "1|80|-1|0|NULL|NULL|now");
-    add("volume not whole", R"("w.jpg", "ringerVolume": 60.5)", defaults);
-    add("volume 150, not favourite", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p")",
-        "0|150|-1|1|NULL|p|now");
-    add("enabled false is no number", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": false})",
-        defaults, { "ringerToneFile|dusk.ogg" });
-    add("enabled 0 keeps the resource", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": 0})",
-        "1|80|-2|1|NULL|NULL|now", { "ringerToneFile|dusk.ogg" });
-    add("empty file falls back", R"("w.jpg", "ringerToneFile": {"enabled": 1})", defaults,
-        { "ringerToneFile|fallback-ringer.ogg" });
-    add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|now");
-    add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
-    add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
-    add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
-    add("timestamp normalised", R"("w.jpg", "timestamp": "2014-05-01T12:00:00.250Z")",
-        "1|80|-1|1|NULL|NULL|2014-05-01T12:00:00Z");
-    add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no",
-        "highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null,
-        "ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|now");
-}
-
-void tst_ThemeletManager::format()
-{
-    QFETCH(QByteArray, json);
-    QFETCH(QString, row);
-    QFETCH(QStringList, resources);
-    const QDateTime since = QDateTime::currentDateTimeUtc();
-    addThemelet("edge", json);
-    QCOMPARE(m_manager->updateMetaData(), false);
-    QCOMPARE(SignalRecorder::calls(), QList<int> { 1 });
-    QCOMPARE(rows("SELECT favorite, ringerVolume, enabledSounds, version, highlightColor, partnerSpace, "
-                  + timestampSince(since) + " FROM themelet"), row.isEmpty() ? QStringList() : QStringList { row });
-    QCOMPARE(rows(s_resources), resources);
-}
-
-void tst_ThemeletManager::malformed_data()
-{
-    QTest::addColumn<QByteArray>("content");   // "<missing>", "<fifo>": a file that can't be opened
-    QTest::addColumn<int>("volume");           // of the bad file's row, 0 for none
-    QTest::addColumn<QStringList>("warnings"); // patterns of the whole records, in order
-    QTest::addColumn<QStringList>("files");    // fileName|ringerVolume|metadataCurrent afterwards
-    const QString parse = "Failed to parse themelet file \"" + QRegularExpression::escape(package("bad"))
-            + "/bad\\.themelet\" , jsonError: %1 , jsonOffset: %2";
-    const QStringList deleted { "bad.themelet|NULL|1", "good.themelet|42|1" };
-    QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41
-                                << QStringList { parse.arg(0).arg(0) } << deleted;
-    QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
-                               << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
-    QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
-    // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
-    QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
-            << QStringList { "virtual bool ThemeletManager::updateMetaData\\(\\)",
-                             "Failed to execute m_insertThemelet\\.", "QSqlError\\(.*themelet\\.fileId.*",
-                             "\"INSERT INTO themelet \\( fileId,.*" }
-            << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
-}
-
-// Bad input doesn't hold up the file after it in the batch.
-void tst_ThemeletManager::malformed()
-{
-    QFETCH(QByteArray, content);
-    QFETCH(int, volume);
-    QFETCH(QStringList, warnings);
-    QFETCH(QStringList, files);
-    const qint64 bad = addThemelet("bad", content);
-    const QString path = package("bad") + "/bad.themelet";
-    if (content.startsWith('<'))
-        QFile::remove(path);
-    if (content == "<fifo>")
-        QCOMPARE(::mkfifo(QFile::encodeName(path).constData(), 0644), 0);
-    // The good file's row shows that the merge passes over a deleted one.
-    const qint64 good = addThemelet("good", R"({"wallpaper": "w.jpg"})");
-    m_db->exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, 42)").arg(good));
-    if (volume)
-        m_db->exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, %2)").arg(bad).arg(volume));
-
-    MessageLog log(false);
-    QCOMPARE(m_manager->updateMetaData(), false);
-    const QString logged = log.warnings().join('\n');
-    QVERIFY2(QRegularExpression('^' + warnings.join('\n') + '$').match(logged).hasMatch(), qPrintable(logged));
-    QCOMPARE(rows("SELECT fileName, ringerVolume, metadataCurrent FROM file LEFT JOIN themelet ON fileId = id"), files);
-    QCOMPARE(SignalRecorder::calls().size(), files[1].endsWith("|1") ? 1 : 0); // announced unless rolled back
-}
-
-void tst_ThemeletManager::reread_data()
-{
-    QTest::addColumn<QString>("wallpaper");
-    QTest::addColumn<QString>("displayName");
-    QTest::addColumn<QString>("row"); // empty for no row
-    QTest::addColumn<QString>("storedName");
-    const QString row = package("re") + "/images/b.jpg|NULL|0|2020-01-01T00:00:00Z|33|-5|#ff00ff00|user|5";
-    QTest::newRow("changed file") << "b.jpg" << "New" << row << "New";
-    QTest::newRow("empty name keeps the old") << "b.jpg" << "" << row << "Old";
-    QTest::newRow("invalid file deletes the row") << "gone.jpg" << "New" << QString() << "Old";
-}
-
-// A re-read takes wallpaper, version, tones and a non-empty name from the file, the rest from the row.
-void tst_ThemeletManager::reread()
-{
-    QFETCH(QString, wallpaper);
-    QFETCH(QString, displayName);
-    QFETCH(QString, row);
-    QFETCH(QString, storedName);
-    write(package("re") + "/images/b.jpg");
-    write(package("re") + "/sounds/chime.ogg");
-    addThemelet("re", R"({"wallpaper": "w.jpg", "displayName": "Old", "version": 1,
-        "ringerToneFile": {"file": "dusk.ogg"}, "messageToneFile": {"file": "dusk.ogg"}})", true);
-    m_db->exec("UPDATE themelet SET favorite = 0, ringerVolume = 33, highlightColor = '#ff00ff00', enabledSounds = -5, "
-               "timestamp = '2020-01-01T00:00:00Z', partnerSpace = 'user', applicationWallpaper = '/x/app.jpg'");
-    write(package("re") + "/re.themelet", QStringLiteral(R"({"wallpaper": "%1", "displayName": "%2", "version": 5,
-        "ringerVolume": 90, "favorite": true, "highlightColor": "#222222", "partnerSpace": "new",
-        "ringerToneFile": {"file": "chime.ogg", "enabled": 0}})").arg(wallpaper, displayName).toUtf8());
-    m_db->exec("UPDATE file SET metadataCurrent = 0");
-
-    QCOMPARE(m_manager->updateMetaData(), false);
-    QCOMPARE(rows("SELECT homeWallpaper, applicationWallpaper, favorite, timestamp, ringerVolume, enabledSounds, "
-                  "highlightColor, partnerSpace, version FROM themelet"),
-             row.isEmpty() ? QStringList() : QStringList { row });
-    QCOMPARE(value("SELECT displayName FROM file WHERE fileName = 're.themelet'"), storedName);
-    if (!row.isEmpty())
-        QCOMPARE(rows(s_resources), QStringList { "ringerToneFile|chime.ogg" });
-}
-
-void tst_ThemeletManager::batchSize()
-{
-    // Invalid files count like any others: 199 files make a full batch and then one of 99.
-    m_db->exec("BEGIN");
-    for (int i = 0; i < 199; ++i)
-        addThemelet(QString::number(i), "{}");
-    m_db->exec("COMMIT");
-    QCOMPARE(m_manager->updateMetaData(), true);
-    QCOMPARE(value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0"), "99");
-    QCOMPARE(m_manager->updateMetaData(), false);
-    QCOMPARE(m_manager->updateMetaData(), false); // nothing left: no transaction, no notice
-    QCOMPARE(SignalRecorder::calls(), (QList<int> { 1, 1 }));
-}
-
-void tst_ThemeletManager::save_data()
-{
-    QTest::addColumn<QString>("before"); // assignments to the row before saving
-    QTest::addColumn<QVariantMap>("values");
-    // name|favorite|timestamp|wallpaper kept|highlight|secondary|volume|enabledSounds|partnerSpace|version
-    QTest::addColumn<QString>("row");
-    const auto add = [](const char *tag, const char *before, const QVariantMap &values, const char *row) {
-        QTest::newRow(tag) << QString(before) << values << QString(row);
-    };
-    const char *read = "Plain|1|2014-05-01T12:00:00|1|NULL|NULL|80|-1|p|1";
-    add("empty map", "", {}, read);
-    add("values", "", { { "displayName", "New" }, { "highlightColor", "#ff112233" }, { "secondaryColor", "#ff445566" },
-                        { "secondaryColors", "#ffffffff" }, { "ringerVolume", 5 }, { "homeWallpaper", "/x.jpg" },
-                        { "partnerSpace", "other" }, { "version", 9 }, { "favorite", QVariant() } },
-        "New|1|2014-05-01T12:00:00|1|#ff112233|#ff445566|5|-1|p|1");
-    add("favourite stays on", "", { { "favorite", true } }, read);
-    add("favourite off", "", { { "favorite", false } }, "Plain|0|NULL|1|NULL|NULL|80|-1|p|1");
-    add("favourite on", "favorite = 0", { { "favorite", true } }, "Plain|1|now|1|NULL|NULL|80|-1|p|1");
-    add("tones off, high bits kept", "", { { "messageToneEnabled", false }, { "clockAlarmToneEnabled", 0 } },
-        "Plain|1|2014-05-01T12:00:00|1|NULL|NULL|80|-67|p|1");
-    add("ringer on", "enabledSounds = -2", { { "ringerToneEnabled", true } }, read);
-}
-
-void tst_ThemeletManager::save()
-{
-    QFETCH(QString, before);
-    QFETCH(QVariantMap, values);
-    QFETCH(QString, row);
-    const qint64 id = addThemelet("plain", R"({"wallpaper": "w.jpg", "displayName": "Plain", "partnerSpace": "p",
-        "timestamp": "2014-05-01T12:00:00", "ringerToneFile": {"file": "dusk.ogg"}})", true);
-    if (!before.isEmpty())
-        m_db->exec("UPDATE themelet SET " + before);
-    const QDateTime since = QDateTime::currentDateTimeUtc();
-    QVERIFY(m_manager->save(id, values));
-    QCOMPARE(rows("SELECT displayName, favorite, " + timestampSince(since) + ", homeWallpaper LIKE '%/images/w.jpg', "
-                  "highlightColor, secondaryColor, ringerVolume, enabledSounds, partnerSpace, version FROM themelet "
-                  "JOIN file ON fileId = file.id"), QStringList { row });
-    QCOMPARE(SignalRecorder::calls(), QList<int>()); // the caller tells the clients
-}
-
-void tst_ThemeletManager::saveResources()
-{
-    const qint64 id = addThemelet("tones", R"({"wallpaper": "w.jpg", "ringerToneFile": {"file": "dusk.ogg"},
-        "messageToneFile": {"file": "dusk.ogg"}, "clockAlarmToneFile": {"file": "dusk.ogg"}})", true);
-    write(user("a.ogg"));
-    write(user("b b.ogg"));
-    const auto url = [](const QVariant &url) { return QVariantMap { { "url", url } }; };
-    QVERIFY(m_manager->save(id, { { "resources", QVariantMap {
-            { "ringerToneFile", url(QUrl::fromLocalFile(user("a.ogg"))) },
-            { "mailToneFile", url(user("b b.ogg")) }, // a plain path
-            { "messageToneFile", url(QUrl()) },       // deletes
-            { "chatToneFile", url(QUrl("http://example.com/x.ogg")) },
-            { "calendarToneFile", url(QUrl::fromLocalFile(user("gone.ogg"))) } } } }));
-    QCOMPARE(rows(s_resources), (QStringList { "clockAlarmToneFile|dusk.ogg", "mailToneFile|b b.ogg",
-                                               "ringerToneFile|a.ogg" }));
-
-    QTest::ignoreMessage(QtWarningMsg, "12345 is not an existing themelet");
-    QVERIFY(!m_manager->save(12345, { { "ringerVolume", 1 } }));
-}
-
-void tst_ThemeletManager::activeThemelet()
-{
-    const qint64 id = addThemelet("active", R"({"wallpaper": "w.jpg"})", true);
-    const qint64 other = addThemelet("other", R"({"wallpaper": "w.jpg"})", true);
-    QList<Themelet> updates;
-    QObject context;
-    connect(m_manager, &ThemeletManager::activeThemeletUpdated, &context, [&](const Themelet &t) { updates << t; });
-    ThemeletSettings settings;
-    settings.setSource(QUrl::fromLocalFile(package("active") + "/active.themelet"));
-    // The manager hears of the change through the store, in the event loop.
-    const auto announced = [&] { updates.clear(); return m_manager->save(id, {}) && !updates.isEmpty(); };
-    QTRY_VERIFY(announced());
-
-    updates.clear();
-    QVERIFY(m_manager->save(id, { { "ringerVolume", 30 } }) && m_manager->save(other, { { "ringerVolume", 30 } }));
-    // A re-read of the active file announces it too; one of another file doesn't.
-    for (const qint64 reread : { other, id }) {
-        m_db->exec(QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE id = %1").arg(reread));
+    void translation()
+    {
+        // One batch in directory order. After a file without a catalogue the same catalogue stays off.
+        const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset" };
+        for (int i = 0; i < catalogs.size(); ++i)
+            addThemelet(QString::number(i), QStringLiteral(R"({"wallpaper": "w.jpg", "translationCatalog": "%1", )"
+                    R"("displayName": "themelet-la-%2"})").arg(catalogs[i], i == 2 ? "dusk" : "sunset").toUtf8());
         m_manager->updateMetaData();
+        QCOMPARE(m_db.rows("SELECT displayName FROM file JOIN themelet ON fileId = id ORDER BY id"), (QStringList {
+                "themelet-la-sunset", "Auringonlasku", "Dusk" /* empty in the locale catalogue */, "themelet-la-sunset",
+                "themelet-la-sunset" }));
+        // A new batch starts with nothing remembered.
+        m_db.exec("UPDATE file SET metadataCurrent = 0 WHERE fileName = '4.themelet'");
+        m_manager->updateMetaData();
+        QCOMPARE(m_db.value("SELECT displayName FROM file WHERE fileName = '4.themelet'").toString(), "Auringonlasku");
     }
-    QCOMPARE(updates.size(), 2);
-    QVERIFY(updates[0]->ringerVolume == 30 && updates[1]->id == id);
-}
 
-void tst_ThemeletManager::createAndRemove()
-{
-    for (const char *file : { "old/mine.themelet", "new/moved.themelet", "home.jpg", "app.jpg" })
-        write(user(file));
-    ThemeletData *data = new ThemeletData(0, QUrl::fromLocalFile(user("old/mine.themelet")));
-    const Themelet themelet(data);
-    data->displayName = "Mine";
-    data->homeWallpaper = user("home.jpg");
-    data->applicationWallpaper = user("app.jpg");
-    data->highlightColor = QColor("#80cc9933");
-    data->favorite = true;
-    const QString select = QStringLiteral("SELECT path, fileName, displayName, favorite, timestamp, highlightColor, "
-            "secondaryColor, ringerVolume, applicationWallpaper FROM themelet JOIN file ON fileId = file.id "
-            "JOIN directory ON directoryId = directory.id");
-    QString row = user("%1|%2|1|NULL|#80cc9933|#ff000000|%3|") + user("app.jpg");
-    const qint64 id = m_manager->create(themelet);
-    QCOMPARE(rows(select), QStringList { row.arg("old|mine.themelet", "Mine").arg(80) }); // favourite, no time
+    void format_data()
+    {
+        QTest::addColumn<QByteArray>("json");
+        QTest::addColumn<QString>("row"); // favorite|ringerVolume|enabledSounds|version|highlight|partner|timestamp
+        QTest::addColumn<QStringList>("resources");
+        const auto add = [](const char *tag, const char *keys, const char *row, const QStringList &resources = {}) {
+            QTest::newRow(tag) << "{\"wallpaper\": " + QByteArray(keys) + '}' << QString(row) << resources;
+        };
+        const char *defaults = "1|80|-1|1|NULL|NULL|now";
+        add("only wallpaper", R"("w.jpg")", defaults);
+        add("slash in wallpaper", R"("images/w.jpg")", "");
+        add("missing wallpaper file", R"("gone.jpg")", "");
+        add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|now");
+        add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
+            R"("timestamp": "2014-05-01T12:00:00.250Z")", "0|150|-1|1|NULL|p|2014-05-01T12:00:00Z");
+        add("enabled false is no number", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": false})",
+            defaults, { "ringerToneFile|dusk.ogg" });
+        add("enabled 0 keeps the resource", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": 0})",
+            "1|80|-2|1|NULL|NULL|now", { "ringerToneFile|dusk.ogg" });
+        add("empty file falls back", R"("w.jpg", "ringerToneFile": {"enabled": 1})", defaults,
+            { "ringerToneFile|fallback-ringer.ogg" });
+        add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|now");
+        add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
+        add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
+        add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
+        add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
+            R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"
+            R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|now");
+    }
 
-    // Again: the user's favourite mark and its time stay. With the id known, a new url moves the row.
-    m_db->exec("UPDATE themelet SET favorite = 0, timestamp = '2020-01-01T00:00:00Z'");
-    row.replace("|1|NULL|", "|0|2020-01-01T00:00:00Z|");
-    data->ringerVolume = 12;
-    QCOMPARE(m_manager->create(themelet), id);
-    QCOMPARE(rows(select), QStringList { row.arg("old|mine.themelet", "Mine").arg(12) });
-    data->id = id;
-    data->url = QUrl::fromLocalFile(user("new/moved.themelet"));
-    data->displayName = "Moved";
-    QCOMPARE(m_manager->create(themelet), id);
-    QCOMPARE(rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
-    QCOMPARE(m_manager->create(Themelet()), qint64(0));
-    QCOMPARE(m_manager->create(Themelet(new ThemeletData(0, QUrl::fromLocalFile(user("gone.themelet"))))), qint64(0));
+    void format()
+    {
+        QFETCH(QByteArray, json);
+        QFETCH(QString, row);
+        QFETCH(QStringList, resources);
+        const QDateTime since = QDateTime::currentDateTimeUtc();
+        addThemelet("edge", json);
+        QCOMPARE(m_manager->updateMetaData(), false);
+        QCOMPARE(SignalRecorder::calls(), QList<int> { 1 });
+        QCOMPARE(m_db.rows("SELECT favorite, ringerVolume, enabledSounds, version, highlightColor, partnerSpace, "
+                           + timestampSince(since) + " FROM themelet"), row.isEmpty() ? QStringList() : QStringList { row });
+        QCOMPARE(m_db.rows(s_resources), resources);
+    }
 
-    // Removal deletes the wallpapers and the row, and keeps the file and its row.
-    QVERIFY(m_manager->remove(id));
-    QVERIFY(!QFile::exists(user("home.jpg")) && !QFile::exists(user("app.jpg")));
-    QVERIFY(QFile::exists(user("new/moved.themelet")));
-    QCOMPARE(value("SELECT fileName || COUNT(fileId) FROM file LEFT JOIN themelet ON fileId = id WHERE id = "
-                   + QString::number(id)), "moved.themelet0");
-    QVERIFY(m_manager->remove(id)); // no themelet: the delete still runs
-    // One read from a file has no application wallpaper; the empty path is tried all the same.
-    const qint64 read = addThemelet("read", R"({"wallpaper": "w.jpg"})", true);
-    QTest::ignoreMessage(QtWarningMsg, "QFile::remove: Empty or null file name");
-    QVERIFY(m_manager->remove(read) && !QFile::exists(package("read") + "/images/w.jpg"));
-}
+    void malformed_data()
+    {
+        QTest::addColumn<QByteArray>("content");   // "<missing>", "<fifo>": a file that can't be opened
+        QTest::addColumn<int>("volume");           // of the bad file's row, 0 for none
+        QTest::addColumn<QStringList>("warnings"); // patterns of the records, in order
+        QTest::addColumn<QStringList>("files");    // fileName|ringerVolume|metadataCurrent afterwards
+        const QString parse = "^Failed to parse themelet file \"" + QRegularExpression::escape(package("bad"))
+                + "/bad\\.themelet\" , jsonError: %1 , jsonOffset: %2$";
+        const QStringList deleted { "bad.themelet|NULL|1", "good.themelet|42|1" };
+        QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
+        QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
+                                   << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
+        QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
+        // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
+        QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
+                << failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
+                           "INSERT INTO themelet ( fileId,")
+                << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
+    }
+
+    // Bad input doesn't hold up the file after it in the batch.
+    void malformed()
+    {
+        QFETCH(QByteArray, content);
+        QFETCH(int, volume);
+        QFETCH(QStringList, warnings);
+        QFETCH(QStringList, files);
+        const qint64 bad = addThemelet("bad", content);
+        const QString path = package("bad") + "/bad.themelet";
+        if (content.startsWith('<'))
+            QFile::remove(path);
+        if (content == "<fifo>")
+            QCOMPARE(::mkfifo(QFile::encodeName(path).constData(), 0644), 0);
+        // The good file's row shows that the merge passes over a deleted one.
+        const qint64 good = addThemelet("good", R"({"wallpaper": "w.jpg"})");
+        m_db.exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, 42)").arg(good));
+        if (volume)
+            m_db.exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, %2)").arg(bad).arg(volume));
+
+        MessageLog log(false);
+        QCOMPARE(m_manager->updateMetaData(), false);
+        compareWarnings(log, warnings);
+        QCOMPARE(m_db.rows("SELECT fileName, ringerVolume, metadataCurrent FROM file LEFT JOIN themelet ON fileId = id"), files);
+        QCOMPARE(SignalRecorder::calls().size(), files[1].endsWith("|1") ? 1 : 0); // announced unless rolled back
+    }
+
+    // A re-read takes wallpaper, version, tones and a non-empty name from the file, the rest from the row.
+    void reread()
+    {
+        QVERIFY(writeTree(package("re"), { "images/b.jpg", "sounds/chime.ogg" }));
+        addThemelet("re", R"({"wallpaper": "w.jpg", "displayName": "Old", "version": 1, )"
+            R"("ringerToneFile": {"file": "dusk.ogg"}, "messageToneFile": {"file": "dusk.ogg"}})", true);
+        m_db.exec("UPDATE themelet SET favorite = 0, ringerVolume = 33, highlightColor = '#ff00ff00', enabledSounds = -5, "
+                  "timestamp = '2020-01-01T00:00:00Z', partnerSpace = 'user', applicationWallpaper = '/x/app.jpg'");
+        for (const QString name : { "", "New" }) {
+            write(package("re") + "/re.themelet", QStringLiteral(R"({"wallpaper": "b.jpg", "displayName": "%1", "version": 5, )"
+                R"("ringerVolume": 90, "favorite": true, "highlightColor": "#222222", "partnerSpace": "new", )"
+                R"("ringerToneFile": {"file": "chime.ogg", "enabled": 0}})").arg(name).toUtf8());
+            QVERIFY(m_db.exec("UPDATE file SET metadataCurrent = 0") && !m_manager->updateMetaData());
+            QCOMPARE(m_db.rows("SELECT displayName, homeWallpaper, applicationWallpaper, favorite, timestamp, ringerVolume, enabledSounds, "
+                               "highlightColor, partnerSpace, version FROM themelet JOIN file ON fileId = id"),
+                     QStringList { (name.isEmpty() ? "Old|" : "New|") + package("re")
+                                   + "/images/b.jpg|NULL|0|2020-01-01T00:00:00Z|33|-5|#ff00ff00|user|5" });
+        }
+        QCOMPARE(m_db.rows(s_resources), QStringList { "ringerToneFile|chime.ogg" });
+    }
+
+    void batchSize()
+    {
+        // Invalid files count like any others: 199 files make a full batch and then one of 99.
+        m_db.exec("BEGIN");
+        for (int i = 0; i < 199; ++i)
+            addThemelet(QString::number(i), "{}");
+        m_db.exec("COMMIT");
+        QCOMPARE(m_manager->updateMetaData(), true);
+        QCOMPARE(m_db.value("SELECT COUNT(*) FROM file WHERE metadataCurrent = 0").toString(), "99");
+        QCOMPARE(m_manager->updateMetaData(), false);
+        QCOMPARE(m_manager->updateMetaData(), false); // nothing left: no transaction, no notice
+        QCOMPARE(SignalRecorder::calls(), (QList<int> { 1, 1 }));
+    }
+
+    void save_data()
+    {
+        QTest::addColumn<QString>("before"); // assignments to the row before saving
+        QTest::addColumn<QVariantMap>("values");
+        // name|favorite|timestamp|wallpaper kept|highlight|secondary|volume|enabledSounds|partnerSpace|version
+        QTest::addColumn<QString>("row");
+        QTest::addColumn<QStringList>("resources");
+        const auto add = [](const char *tag, const char *before, const QVariantMap &values, const char *row, const QStringList &resources =
+                { "clockAlarmToneFile|dusk.ogg", "messageToneFile|dusk.ogg", "ringerToneFile|dusk.ogg" }) {
+            QTest::newRow(tag) << QString(before) << values << QString(row) << resources;
+        };
+        const char *read = "Plain|1|2014-05-01T12:00:00|1|NULL|NULL|80|-1|p|1";
+        add("empty map", "", {}, read);
+        add("values", "", { { "displayName", "New" }, { "highlightColor", "#ff112233" }, { "secondaryColor", "#ff445566" },
+                            { "secondaryColors", "#ffffffff" }, { "ringerVolume", 5 }, { "homeWallpaper", "/x.jpg" },
+                            { "partnerSpace", "other" }, { "version", 9 }, { "favorite", QVariant() } },
+            "New|1|2014-05-01T12:00:00|1|#ff112233|#ff445566|5|-1|p|1");
+        add("favourite stays on", "", { { "favorite", true } }, read);
+        add("favourite off", "", { { "favorite", false } }, "Plain|0|NULL|1|NULL|NULL|80|-1|p|1");
+        add("favourite on", "favorite = 0", { { "favorite", true } }, "Plain|1|now|1|NULL|NULL|80|-1|p|1");
+        add("tones off, high bits kept", "", { { "messageToneEnabled", false }, { "clockAlarmToneEnabled", 0 } },
+            "Plain|1|2014-05-01T12:00:00|1|NULL|NULL|80|-67|p|1");
+        add("ringer on", "enabledSounds = -2", { { "ringerToneEnabled", true } }, read);
+        const auto url = [](const QVariant &url) { return QVariantMap { { "url", url } }; };
+        add("resources", "", { { "resources", QVariantMap {
+                { "ringerToneFile", url(QUrl::fromLocalFile(user("a.ogg"))) },
+                { "mailToneFile", url(user("b b.ogg")) }, // a plain path
+                { "messageToneFile", url(QUrl()) },       // deletes
+                { "chatToneFile", url(QUrl("http://example.com/x.ogg")) },
+                { "calendarToneFile", url(QUrl::fromLocalFile(user("gone.ogg"))) } } } },
+            read, { "clockAlarmToneFile|dusk.ogg", "mailToneFile|b b.ogg", "ringerToneFile|a.ogg" });
+    }
+
+    void save()
+    {
+        QFETCH(QString, before);
+        QFETCH(QVariantMap, values);
+        QFETCH(QString, row);
+        QFETCH(QStringList, resources);
+        QVERIFY(writeTree(user({}), { "a.ogg", "b b.ogg" }));
+        const qint64 id = addThemelet("plain", R"({"wallpaper": "w.jpg", "displayName": "Plain", "partnerSpace": "p", "timestamp": )"
+            R"("2014-05-01T12:00:00", "ringerToneFile": {"file": "dusk.ogg"}, "messageToneFile": {"file": "dusk.ogg"}, )"
+            R"("clockAlarmToneFile": {"file": "dusk.ogg"}})", true);
+        if (!before.isEmpty())
+            m_db.exec("UPDATE themelet SET " + before);
+        const QDateTime since = QDateTime::currentDateTimeUtc();
+        QVERIFY(m_manager->save(id, values));
+        QCOMPARE(m_db.rows("SELECT displayName, favorite, " + timestampSince(since) + ", homeWallpaper LIKE '%/images/w.jpg', "
+                           "highlightColor, secondaryColor, ringerVolume, enabledSounds, partnerSpace, version FROM themelet "
+                           "JOIN file ON fileId = file.id"), QStringList { row });
+        QCOMPARE(m_db.rows(s_resources), resources);
+        QCOMPARE(SignalRecorder::calls(), QList<int>()); // the caller tells the clients
+    }
+
+    void settingsSignals_data()
+    {
+        QTest::addColumn<QString>("key");
+        QTest::addColumn<QString>("value"); // given to the key's setter, or written by dconf if GVariant text
+        QTest::addColumn<QString>("state"); // signals of source, application and home image, then the values
+        QTest::newRow("source") << s_sourceKey << "file:///t/sun set.themelet" << "100 file:///t/sun set.themelet||";
+        QTest::newRow("remote source clears") << s_sourceKey << "http://x/a.themelet" << "100 ||";
+        QTest::newRow("application image") << s_applicationKey << "/p/app.jpg" << "010 |/p/app.jpg|";
+        QTest::newRow("home image") << s_homeKey << "relative.jpg" << "001 ||relative.jpg";
+        QTest::newRow("other process") << s_sourceKey << "'/t/a.themelet'" << "100 file:///t/a.themelet||";
+    }
+
+    // ThemeletSettings: a setter emits nothing, the signal comes once the store reports the change.
+    void settingsSignals()
+    {
+        QFETCH(QString, key);
+        QFETCH(QString, value);
+        QFETCH(QString, state);
+        for (const QString &each : { s_sourceKey, s_applicationKey, s_homeKey })
+            DConfTest::reset(each);
+        QVERIFY(DConfTest::barrier());
+        ThemeletSettings settings;
+        QSignalSpy source(&settings, &ThemeletSettings::sourceChanged), application(&settings, &ThemeletSettings::applicationImageChanged),
+                home(&settings, &ThemeletSettings::homeImageChanged);
+        const auto current = [&] {
+            return QStringLiteral("%1%2%3 ").arg(source.count()).arg(application.count()).arg(home.count())
+                    + settings.source().toString() + '|' + settings.applicationImagePath() + '|' + settings.homeImagePath();
+        };
+        QCOMPARE(current(), QStringLiteral("000 ||")); // unset keys read empty
+
+        if (value.startsWith('\''))
+            DConfTest::write(key, value);
+        else if (key == s_sourceKey)
+            settings.setSource(QUrl(value));
+        else if (key == s_homeKey)
+            settings.setHomeImagePath(value);
+        else
+            settings.setApplicationImagePath(value);
+        QCOMPARE(current().left(3), QStringLiteral("000"));
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(current(), state);
+    }
+
+    void activeThemelet()
+    {
+        const qint64 id = addThemelet("active", R"({"wallpaper": "w.jpg"})", true);
+        const qint64 other = addThemelet("other", R"({"wallpaper": "w.jpg"})", true);
+        QList<Themelet> updates;
+        QObject context;
+        connect(m_manager, &ThemeletManager::activeThemeletUpdated, &context, [&](const Themelet &t) { updates << t; });
+        ThemeletSettings settings;
+        settings.setSource(QUrl::fromLocalFile(package("active") + "/active.themelet"));
+        // The manager hears of the change through the store, in the event loop.
+        const auto announced = [&] { updates.clear(); return m_manager->save(id, {}) && !updates.isEmpty(); };
+        QTRY_VERIFY(announced());
+
+        // A save of the active themelet announces it once, and so does a re-read of its file; those of another don't.
+        updates.clear();
+        QVERIFY(m_manager->save(id, { { "ringerVolume", 30 } }) && m_manager->save(other, { { "ringerVolume", 30 } }));
+        QVERIFY(m_db.exec("UPDATE file SET metadataCurrent = 0") && !m_manager->updateMetaData());
+        QCOMPARE(updates.size(), 2);
+        QVERIFY(updates[0]->ringerVolume == 30 && updates[1]->id == id);
+    }
+
+    void createAndRemove()
+    {
+        QVERIFY(writeTree(user({}), { "old/mine.themelet", "new/moved.themelet", "home.jpg", "app.jpg" }));
+        ThemeletData *data = new ThemeletData(0, QUrl::fromLocalFile(user("old/mine.themelet")));
+        const Themelet themelet(data);
+        data->displayName = "Mine";
+        data->homeWallpaper = user("home.jpg");
+        data->applicationWallpaper = user("app.jpg");
+        data->highlightColor = QColor("#80cc9933");
+        data->favorite = true;
+        const QString select = "SELECT path, fileName, displayName, favorite, timestamp, highlightColor, secondaryColor, ringerVolume, "
+                               "applicationWallpaper FROM themelet JOIN file ON fileId = file.id JOIN directory ON directoryId = "
+                               "directory.id";
+        QString row = user("%1|%2|1|NULL|#80cc9933|#ff000000|%3|") + user("app.jpg");
+        const qint64 id = m_manager->create(themelet);
+        QCOMPARE(m_db.rows(select), QStringList { row.arg("old|mine.themelet", "Mine").arg(80) }); // favourite, no time
+
+        // Again: the user's favourite mark and its time stay. With the id known, a new url moves the row.
+        m_db.exec("UPDATE themelet SET favorite = 0, timestamp = '2020-01-01T00:00:00Z'");
+        row.replace("|1|NULL|", "|0|2020-01-01T00:00:00Z|");
+        data->ringerVolume = 12;
+        QCOMPARE(m_manager->create(themelet), id);
+        QCOMPARE(m_db.rows(select), QStringList { row.arg("old|mine.themelet", "Mine").arg(12) });
+        data->id = id;
+        data->url = QUrl::fromLocalFile(user("new/moved.themelet"));
+        data->displayName = "Moved";
+        QCOMPARE(m_manager->create(themelet), id);
+        QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
+        // Nothing to act on: no themelet, no file, an unknown id.
+        QCOMPARE(m_manager->create(Themelet()) + m_manager->create(Themelet(new ThemeletData(0, QUrl::fromLocalFile(user("gone"))))), 0);
+        QTest::ignoreMessage(QtWarningMsg, "12345 is not an existing themelet");
+        QVERIFY(!m_manager->save(12345, { { "ringerVolume", 1 } }));
+
+        // Removal deletes the wallpapers and the row, and keeps the file and its row; with no themelet the delete still runs.
+        QVERIFY(m_manager->remove(id) && m_manager->remove(id));
+        QVERIFY(!QFile::exists(user("home.jpg")) && !QFile::exists(user("app.jpg")) && QFile::exists(user("new/moved.themelet")));
+        QCOMPARE(m_db.rows("SELECT fileName, fileId FROM file LEFT JOIN themelet ON fileId = id"), QStringList { "moved.themelet|NULL" });
+        // One read from a file has no application wallpaper; the empty path is tried all the same.
+        const qint64 read = addThemelet("read", R"({"wallpaper": "w.jpg"})", true);
+        QTest::ignoreMessage(QtWarningMsg, "QFile::remove: Empty or null file name");
+        QVERIFY(m_manager->remove(read) && !QFile::exists(package("read") + "/images/w.jpg"));
+    }
+};
 
 QTEST_GUILESS_MAIN(tst_ThemeletManager)
 #include "tst_themeletmanager.moc"
