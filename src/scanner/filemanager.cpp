@@ -13,6 +13,7 @@
 #include <algorithm>
 #include <cstdlib>
 #include <cstring>
+#include <functional>
 #include <memory>
 
 #include <sys/inotify.h>
@@ -554,6 +555,30 @@ bool FileManager::scanDirectory()
     return true;
 }
 
+// The id that the lookup finds, or else that of the row the insert makes, its
+// values bound only then; 0 after a failure, which has been rolled back.
+qint64 FileManager::findOrInsert(QSqlQuery &lookup, const char *lookupFailure, QSqlQuery &insert,
+                                 const char *insertFailure, const std::function<void()> &bindInsert)
+{
+    if (!lookup.exec()) {
+        rollback(lookup, InsertFileSignature, lookupFailure);
+        return 0;
+    }
+    const bool found = lookup.next();
+    const qint64 id = found ? lookup.value(0).toLongLong() : 0;
+    lookup.finish();
+    if (found)
+        return id;
+    bindInsert();
+    if (!insert.exec()) {
+        rollback(insert, InsertFileSignature, insertFailure);
+        return 0;
+    }
+    const qint64 inserted = insert.lastInsertId().toLongLong();
+    insert.finish();
+    return inserted;
+}
+
 qint64 FileManager::insertFile(const QString &path)
 {
     const QFileInfo info(path);
@@ -564,25 +589,13 @@ qint64 FileManager::insertFile(const QString &path)
 
     const QString directory = info.absolutePath();
     m_directoryIdQuery.bindValue(0, directory);
-    if (!m_directoryIdQuery.exec()) {
-        rollback(m_directoryIdQuery, InsertFileSignature, "Failed to execute m_directoryIdQuery.");
-        return 0;
-    }
-    qint64 directoryId = 0;
-    if (m_directoryIdQuery.next()) {
-        directoryId = m_directoryIdQuery.value(0).toLongLong();
-        m_directoryIdQuery.finish();
-    } else {
-        m_directoryIdQuery.finish();
+    const qint64 directoryId = findOrInsert(m_directoryIdQuery, "Failed to execute m_directoryIdQuery.",
+                                            m_directoryAppend, "Failed to execute m_directoryAppend.", [&]() {
         m_directoryAppend.bindValue(0, directory);
         m_directoryAppend.bindValue(1, int(InstallScope));
-        if (!m_directoryAppend.exec()) {
-            rollback(m_directoryAppend, InsertFileSignature, "Failed to execute m_directoryAppend.");
-            return 0;
-        }
-        directoryId = m_directoryAppend.lastInsertId().toLongLong();
-        m_directoryAppend.finish();
-    }
+    });
+    if (directoryId == 0)
+        return 0;
 
     // Known or not: a watched directory is passed over, an unwatched one gets its watch.
     m_pendingDirectories.append(directory);
@@ -590,27 +603,15 @@ qint64 FileManager::insertFile(const QString &path)
 
     m_fileIdQuery.bindValue(0, directoryId);
     m_fileIdQuery.bindValue(1, info.fileName());
-    if (!m_fileIdQuery.exec()) {
-        rollback(m_fileIdQuery, InsertFileSignature, "Failed to execute m_fileIdQuery.");
-        return 0;
-    }
-    qint64 id = 0;
-    if (m_fileIdQuery.next()) {
-        id = m_fileIdQuery.value(0).toLongLong();
-        m_fileIdQuery.finish();
-    } else {
-        m_fileIdQuery.finish();
+    const qint64 id = findOrInsert(m_fileIdQuery, "Failed to execute m_fileIdQuery.",
+                                   m_fileInsert, "Failed to execute m_fileInsert.", [&]() {
         m_fileInsert.bindValue(0, directoryId);
         m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
         m_fileInsert.bindValue(2, info.fileName());
         m_fileInsert.bindValue(3, info.lastModified());
-        if (!m_fileInsert.exec()) {
-            rollback(m_fileInsert, InsertFileSignature, "Failed to execute m_fileInsert.");
-            return 0;
-        }
-        id = m_fileInsert.lastInsertId().toLongLong();
-        m_fileInsert.finish();
-    }
+    });
+    if (id == 0)
+        return 0;
 
     commit();
     return id;

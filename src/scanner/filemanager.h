@@ -11,6 +11,8 @@
 #include <QSqlQuery>
 #include <QStringList>
 
+#include <functional>
+
 // The manager of plain files. It is the socket notifier on its own inotify
 // descriptor and drives the service's update loop: one directory scan or one
 // metadata step per posted QEvent::UpdateRequest, no timers, no threads.
@@ -63,6 +65,8 @@ protected:
     bool event(QEvent *event) override;
 
 private:
+    qint64 findOrInsert(QSqlQuery &lookup, const char *lookupFailure, QSqlQuery &insert,
+                        const char *insertFailure, const std::function<void()> &bindInsert);
     bool readEvent();
     bool scanDirectory();
     void postUpdate();
