@@ -144,7 +144,8 @@ QString ThemeletService::localPath(const QString &url, const char *what)
     if (url.startsWith(QLatin1Char('/'))) {
         path = url;
     } else {
-        const QUrl parsed(url, QUrl::StrictMode);
+        // Clients send QUrl::toString(), which leaves spaces as they are.
+        const QUrl parsed(url);
         if (parsed.isValid() && parsed.isLocalFile()
             && (parsed.host().isEmpty() || parsed.host() == QLatin1String("localhost")))
             path = parsed.toLocalFile();
