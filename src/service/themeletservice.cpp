@@ -28,6 +28,8 @@ const char *const s_fileQuery =
         "themelet.applicationWallpaper FROM file LEFT JOIN themelet ON themelet.fileId = file.id "
         "WHERE file.id = ?;";
 
+const char *const s_directoryQuery = "SELECT scope FROM directory WHERE path = ?;";
+
 bool isInside(const QString &path, const QString &directory)
 {
     return QDir::cleanPath(path).startsWith(QDir::cleanPath(directory) + QLatin1Char('/'));
@@ -94,6 +96,9 @@ void ThemeletService::start(const QStringList &watchedDirectories)
     m_fileQuery = QSqlQuery(DbManager::instance());
     if (!m_fileQuery.prepare(QLatin1String(s_fileQuery)))
         qWarning() << "Failed to prepare m_fileQuery." << m_fileQuery.lastError();
+    m_directoryQuery = QSqlQuery(DbManager::instance());
+    if (!m_directoryQuery.prepare(QLatin1String(s_directoryQuery)))
+        qWarning() << "Failed to prepare m_directoryQuery." << m_directoryQuery.lastError();
     connect(themelets, &ThemeletManager::activeThemeletUpdated, this, &ThemeletService::applyThemelet);
 
     for (const QString &path : InstallManager::installPaths())
@@ -114,6 +119,7 @@ void ThemeletService::stop()
         return;
     m_started = false;
     m_fileQuery = QSqlQuery();
+    m_directoryQuery = QSqlQuery();
     QSqlDatabase &database = DbManager::instance();
     {
         QSqlQuery checkpoint(database);
@@ -378,6 +384,19 @@ void ThemeletService::installPackage(const QString &path)
     }
     if (!info.isDir()) {
         fail(InvalidArgs, QStringLiteral("'%1' is not a directory").arg(directory));
+        return;
+    }
+    // Installing turns the directory into a package: a user's or an install directory stays what it is.
+    m_directoryQuery.bindValue(0, directory);
+    if (!m_directoryQuery.exec()) {
+        qWarning() << "Failed to execute m_directoryQuery" << m_directoryQuery.lastError();
+        fail(Failed, QStringLiteral("The index could not be read"));
+        return;
+    }
+    const bool otherScope = m_directoryQuery.next() && m_directoryQuery.value(0).toInt() != FileManager::PackageScope;
+    m_directoryQuery.finish();
+    if (otherScope) {
+        fail(InvalidArgs, QStringLiteral("'%1' is indexed as another kind of directory, not as a package").arg(directory));
         return;
     }
     if (!installManager()->install(directory, QString(), false)) {
