@@ -46,9 +46,14 @@ bool isNumber(const QVariant &value)
     }
 }
 
+bool isInteger(const QVariant &value)
+{
+    return isNumber(value) && value.userType() != QMetaType::Double;
+}
+
 bool isFlag(const QVariant &value)
 {
-    return value.userType() == QMetaType::Bool || (isNumber(value) && value.userType() != QMetaType::Double);
+    return value.userType() == QMetaType::Bool || isInteger(value);
 }
 
 // A value of the profile "themelet", or a null array when neither it nor the defaults have one.
@@ -218,8 +223,8 @@ bool ThemeletService::checkThemeletValues(const QVariantMap &values)
             if (value.userType() != QMetaType::QString)
                 return refuse(key, "a string");
         } else if (key == QLatin1String("ringerVolume")) {
-            if (!isNumber(value) || value.toDouble() < 0 || value.toDouble() > 100)
-                return refuse(key, "a number from 0 to 100");
+            if (!isInteger(value) || value.toLongLong() < 0 || value.toLongLong() > 100)
+                return refuse(key, "a whole number from 0 to 100");
         } else if (key == QLatin1String("favorite") || key.endsWith(QLatin1String("ToneEnabled"))) {
             if (!isFlag(value))
                 return refuse(key, "a boolean");
