@@ -98,6 +98,9 @@ void ThemeletService::start(const QStringList &watchedDirectories)
         qCritical("themeletd: the content managers could not be made");
         return;
     }
+    // The writer mostly walks rows once; a 512 KiB page cache instead of 2 MiB
+    // keeps the resident size of a big index down at no measurable cost in speed.
+    QSqlQuery(DbManager::instance()).exec(QStringLiteral("PRAGMA cache_size = -512;"));
     m_fileQuery = QSqlQuery(DbManager::instance());
     if (!m_fileQuery.prepare(QLatin1String(s_fileQuery)))
         qWarning() << "Failed to prepare m_fileQuery." << m_fileQuery.lastError();
