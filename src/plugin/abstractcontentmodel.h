@@ -57,8 +57,6 @@ public:
     Q_INVOKABLE void remove(int index);
     Q_INVOKABLE int indexOf(const QString &property, const QVariant &value) const;
 
-    // What goes on the bus for a value: colours as "#AARRGGBB", URLs as text.
-    static QVariant dbusValue(const QVariant &value);
     // `overlay` laid over `base`, maps merged key by key to any depth; with
     // `convert`, the values taken from `overlay` are in their D-Bus form.
     static QVariantMap mergeMaps(QVariantMap base, const QVariantMap &overlay, bool convert = false);
