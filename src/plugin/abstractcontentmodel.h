@@ -54,6 +54,7 @@ public:
     Q_INVOKABLE QJSValue get(int index) const;
     Q_INVOKABLE void set(int index, const QJSValue &properties);
     Q_INVOKABLE void setProperty(int index, const QString &property, const QVariant &value);
+    using QObject::setProperty; // not hidden by the row writer above
     Q_INVOKABLE void remove(int index);
     Q_INVOKABLE int indexOf(const QString &property, const QVariant &value) const;
 

@@ -251,7 +251,7 @@ private slots:
     void failedQuery()
     {
         // No agent for the type: an error, and the rows that the query did not deliver go.
-        FileModel model(99);
+        FileModel model(ThemeletContent::Video);
         QSignalSpy status(&model, &AbstractContentModel::statusChanged);
         model.requery();
         QVERIFY(waitDone(model));
