@@ -1,6 +1,5 @@
 #include "contentinfo.h"
 
-#include "abstractcontentmodel.h"
 #include "queryagent.h"
 #include "themeletinterface.h"
 
@@ -240,6 +239,6 @@ void ContentInfo::storeChange(QObject *object, int signalIndex, const QStringLis
     for (int i = 0; i < meta->propertyCount(); ++i) {
         const QMetaProperty property = meta->property(i);
         if (property.notifySignalIndex() == signalIndex)
-            map->insert(QString::fromUtf8(property.name()), AbstractContentModel::dbusValue(property.read(object)));
+            map->insert(QString::fromUtf8(property.name()), ThemeletInterface::dbusValue(property.read(object)));
     }
 }
