@@ -89,6 +89,8 @@ TestCase {
         compare(column(filtered, "fileName"), ["ab.jpg", "abc.jpg"])
         compare(column(model, "fileName"), ["b.jpg", "ab.jpg", "a.jpg", "abc.jpg"])
 
+        var filterSignals = 0
+        model.nameFilterChanged.connect(function() { ++filterSignals })
         var steps = [["a", ["ab.jpg", "a.jpg", "abc.jpg"]], ["ab", ["ab.jpg", "abc.jpg"]],
                      ["", ["b.jpg", "ab.jpg", "a.jpg", "abc.jpg"]]]
         for (var i = 0; i < steps.length; ++i) {
@@ -97,6 +99,7 @@ TestCase {
             compare(model.count, steps[i][1].length, steps[i][0])
             compare(column(model, "fileName"), steps[i][1], steps[i][0])
         }
+        compare(filterSignals, 0) // declared, never emitted
 
         verify(Fixture.index(["photo", "abd.jpg"]))
         verify(service.emitContentChanged(2))
