@@ -17,23 +17,24 @@ struct ControlTool::Command
     int minArguments;
     int maxArguments;
     const char *summary;
+    bool needsService;
     int (ControlTool::*handler)(const QStringList &);
 };
 
 const ControlTool::Command ControlTool::s_commands[] = {
-    { "list", "themelets|photos|tones", 1, 1, "list the index", &ControlTool::list },
-    { "show", "ID|URL", 1, 1, "one indexed item with all its fields", &ControlTool::show },
-    { "set", "ID|URL", 1, 1, "make a themelet the active one", &ControlTool::set },
-    { "create", "PICTURE", 1, 1, "create a themelet from a picture", &ControlTool::create },
-    { "favorite", "ID|URL on|off", 2, 2, "mark or unmark a favourite themelet", &ControlTool::favorite },
-    { "install", "DIR", 1, 1, "install the package in a directory", &ControlTool::install },
-    { "index", "FILE", 1, 1, "have one file indexed", &ControlTool::index },
-    { "refresh", "", 0, 0, "rescan the installed themelets", &ControlTool::refresh },
-    { "remove", "TYPE ID|URL", 2, 2, "delete an item; TYPE is file, themelet, photo or a number",
+    { "list", "themelets|photos|tones", 1, 1, "list the index", false, &ControlTool::list },
+    { "show", "ID|URL", 1, 1, "one indexed item with all its fields", false, &ControlTool::show },
+    { "set", "ID|URL", 1, 1, "make a themelet the active one", true, &ControlTool::set },
+    { "create", "PICTURE", 1, 1, "create a themelet from a picture", true, &ControlTool::create },
+    { "favorite", "ID|URL on|off", 2, 2, "mark or unmark a favourite themelet", true, &ControlTool::favorite },
+    { "install", "DIR", 1, 1, "install the package in a directory", true, &ControlTool::install },
+    { "index", "FILE", 1, 1, "have one file indexed", true, &ControlTool::index },
+    { "refresh", "", 0, 0, "rescan the installed themelets", true, &ControlTool::refresh },
+    { "remove", "TYPE ID|URL", 2, 2, "delete an item; TYPE is file, themelet, photo or a number", true,
       &ControlTool::remove },
-    { "monitor", "", 0, 0, "print each contentChanged of the service until it stops",
+    { "monitor", "", 0, 0, "print each contentChanged of the service until it stops", false,
       &ControlTool::monitor },
-    { "status", "", 0, 0, "service, index file, schema version and row counts", &ControlTool::status },
+    { "status", "", 0, 0, "service, index file, schema version and row counts", false, &ControlTool::status },
 };
 
 namespace {
@@ -131,6 +132,9 @@ int ControlTool::run(const QStringList &arguments)
                               + QString::fromLatin1(*command.synopsis ? " " : "")
                               + QString::fromLatin1(command.synopsis));
         }
+        // Before any look-up in the index, so that a missing service is the one line.
+        if (command.needsService && !m_service.isRunning())
+            return failure(m_service.errorString());
         return (this->*command.handler)(positional);
     }
     return usageError(QStringLiteral("unknown command '") + name + QLatin1Char('\''));
@@ -421,7 +425,8 @@ int ControlTool::status(const QStringList &)
         table.append({ QStringLiteral("service:"),
                        running ? QStringLiteral("running") + (pid ? QStringLiteral(" (pid ") + QString::number(pid)
                                                                             + QLatin1Char(')') : QString())
-                               : QStringLiteral("not running: ") + serviceError });
+                               : m_service.connection().isConnected() ? QStringLiteral("not running")
+                                                                      : QStringLiteral("unknown: ") + serviceError });
         table.append({ QStringLiteral("database:"),
                        path + (!exists ? QStringLiteral(" (missing)")
                                        : !readable ? QStringLiteral(" (unreadable)") : QString()) });
