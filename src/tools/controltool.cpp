@@ -17,24 +17,23 @@ struct ControlTool::Command
     int minArguments;
     int maxArguments;
     const char *summary;
-    bool needsService;
     int (ControlTool::*handler)(const QStringList &);
 };
 
 const ControlTool::Command ControlTool::s_commands[] = {
-    { "list", "themelets|photos|tones", 1, 1, "list the index", false, &ControlTool::list },
-    { "show", "ID|URL", 1, 1, "one indexed item with all its fields", false, &ControlTool::show },
-    { "set", "ID|URL", 1, 1, "make a themelet the active one", true, &ControlTool::set },
-    { "create", "PICTURE", 1, 1, "create a themelet from a picture", true, &ControlTool::create },
-    { "favorite", "ID|URL on|off", 2, 2, "mark or unmark a favourite themelet", true, &ControlTool::favorite },
-    { "install", "DIR", 1, 1, "install the package in a directory", true, &ControlTool::install },
-    { "index", "FILE", 1, 1, "have one file indexed", true, &ControlTool::index },
-    { "refresh", "", 0, 0, "rescan the installed themelets", true, &ControlTool::refresh },
-    { "remove", "TYPE ID|URL", 2, 2, "delete an item; TYPE is file, themelet, photo or a number", true,
+    { "list", "themelets|photos|tones", 1, 1, "list the index", &ControlTool::list },
+    { "show", "ID|URL", 1, 1, "one indexed item with all its fields", &ControlTool::show },
+    { "set", "ID|URL", 1, 1, "make a themelet the active one", &ControlTool::set },
+    { "create", "PICTURE", 1, 1, "create a themelet from a picture", &ControlTool::create },
+    { "favorite", "ID|URL on|off", 2, 2, "mark or unmark a favourite themelet", &ControlTool::favorite },
+    { "install", "DIR", 1, 1, "install the package in a directory", &ControlTool::install },
+    { "index", "FILE", 1, 1, "have one file indexed", &ControlTool::index },
+    { "refresh", "", 0, 0, "rescan the installed themelets", &ControlTool::refresh },
+    { "remove", "TYPE ID|URL", 2, 2, "delete an item; TYPE is file, themelet, photo or a number",
       &ControlTool::remove },
-    { "monitor", "", 0, 0, "print each contentChanged of the service until it stops", false,
+    { "monitor", "", 0, 0, "print each contentChanged of the service until it stops",
       &ControlTool::monitor },
-    { "status", "", 0, 0, "service, index file, schema version and row counts", false, &ControlTool::status },
+    { "status", "", 0, 0, "service, index file, schema version and row counts", &ControlTool::status },
 };
 
 namespace {
@@ -132,9 +131,6 @@ int ControlTool::run(const QStringList &arguments)
                               + QString::fromLatin1(*command.synopsis ? " " : "")
                               + QString::fromLatin1(command.synopsis));
         }
-        // Before any look-up in the index, so that a missing service is the one line.
-        if (command.needsService && !m_service.isRunning())
-            return failure(m_service.errorString());
         return (this->*command.handler)(positional);
     }
     return usageError(QStringLiteral("unknown command '") + name + QLatin1Char('\''));
@@ -151,6 +147,14 @@ int ControlTool::failure(const QString &message)
 {
     ContentPrinter::printError(message);
     return Failure;
+}
+
+bool ControlTool::serviceMissing()
+{
+    if (m_service.isRunning())
+        return false;
+    failure(m_service.errorString());
+    return true;
 }
 
 int ControlTool::call(const QString &method, const QVariantList &arguments, const QString &replySignature,
@@ -299,7 +303,7 @@ int ControlTool::show(const QStringList &arguments)
 int ControlTool::set(const QStringList &arguments)
 {
     QUrl url;
-    if (!urlOf(arguments.first(), &url))
+    if (serviceMissing() || !urlOf(arguments.first(), &url))
         return Failure;
     QVariant id;
     if (const int code = call(QStringLiteral("setThemelet"), { url.toString() }, QStringLiteral("x"), &id))
@@ -328,6 +332,8 @@ int ControlTool::favorite(const QStringList &arguments)
     if (!s_on.contains(value) && !s_off.contains(value))
         return usageError(QStringLiteral("favorite takes on or off, not '") + value + QLatin1Char('\''));
     const bool on = s_on.contains(value);
+    if (serviceMissing())
+        return Failure;
 
     // A themelet is edited like the gallery does it, which also orders the
     // favourites by time; anything else is taken for a wallpaper.
@@ -374,6 +380,8 @@ int ControlTool::remove(const QStringList &arguments)
                           + QStringLiteral("': file, themelet, photo, video, download or a number"));
     }
     qint64 id = 0;
+    if (serviceMissing())
+        return Failure;
     if (!isId(arguments.at(1), &id)) {
         const Content content = lookUp(arguments.at(1));
         if (!content.isValid())

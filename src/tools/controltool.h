@@ -37,6 +37,8 @@ private:
 
     int usageError(const QString &message);
     int failure(const QString &message);
+    // Prints why when themeletd isn't there; writes ask before they look anything up.
+    bool serviceMissing();
     // A call of themeletd; prints its error on failure.
     int call(const QString &method, const QVariantList &arguments, const QString &replySignature = QString(),
              QVariant *reply = nullptr);
