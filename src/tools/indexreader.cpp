@@ -133,7 +133,9 @@ bool IndexReader::statistics(Counts *counts, int *schemaVersion)
     static const QPair<const char *, const char *> s_counts[] = {
         { "directories", "SELECT COUNT(*) FROM directory;" },
         { "files", "SELECT COUNT(*) FROM file;" },
-        { "pending", "SELECT COUNT(*) FROM file WHERE metadataCurrent = 0;" },
+        // Stale rows that a manager will read; other types stay stale for good.
+        { "pending", "SELECT COUNT(*) FROM file WHERE metadataCurrent = 0 AND (mimeType GLOB 'image/*' "
+                     "OR mimeType IN ('application/x-vorka-themelet', 'application/x-vorka-index'));" },
         { "themelets", "SELECT COUNT(*) FROM themelet;" },
         { "photos", "SELECT COUNT(*) FROM image;" },
     };

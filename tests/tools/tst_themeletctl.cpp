@@ -23,13 +23,15 @@ QString pictures() { return sandbox() + QStringLiteral("/home/Pictures"); }
 QString package() { return InstallManager::installPaths().at(0) + QStringLiteral("/sunset"); }
 QString tones() { return InstallManager::installPaths().at(1) + QStringLiteral("/classic"); }
 QString s_themeletId;
+QString s_createdId;
 
-// %P the package, %H the Pictures folder, %S the sandbox, %T the package themelet's id.
+// %P the package, %H the Pictures folder, %S the sandbox, %T the package
+// themelet's id, %C the id of the themelet created last.
 QString expand(QString text, bool forPattern = false)
 {
     const auto path = [forPattern](const QString &value) { return forPattern ? QRegularExpression::escape(value) : value; };
     return text.replace(QLatin1String("%P"), path(package())).replace(QLatin1String("%H"), path(pictures()))
-            .replace(QLatin1String("%S"), path(sandbox())).replace(QLatin1String("%T"), s_themeletId);
+            .replace(QLatin1String("%S"), path(sandbox())).replace(QLatin1String("%T"), s_themeletId).replace(QLatin1String("%C"), s_createdId);
 }
 
 Result ctl(const QStringList &arguments, const QProcessEnvironment &environment = QProcessEnvironment::systemEnvironment())
@@ -168,6 +170,8 @@ class TestThemeletctl : public QObject
         QVERIFY2(timer.elapsed() < 10000, "no timeouts");
         QVERIFY2(result.exitCode == exitCode, qPrintable(result.out + result.err));
         QVERIFY2(QRegularExpression(expand(err, true)).match(result.err).hasMatch(), qPrintable(result.err));
+        if (arguments.value(0) == QLatin1String("create") && exitCode == 0)
+            s_createdId = QRegularExpression(QStringLiteral("(themelet |\"contentId\": )(\\d+)")).match(result.out).captured(2);
         if (arguments.contains("--json")) {
             const QString failed = failedCheck(result, out);
             QVERIFY2(failed.isEmpty(), qPrintable(failed));
@@ -206,7 +210,8 @@ private slots:
         QVERIFY(QDir().mkpath(package() + "/images") && QDir().mkpath(pictures()));
         QVERIFY(writeJpeg(package() + "/images/sunset.jpg"));
         QVERIFY(write(package() + "/sounds/dusk.ogg", "OggS"));
-        QVERIFY(writeTree(tones(), { "bell.ogg", "alarm.ogg" }, "OggS"));
+        // A tone pack: tones.index describes the directory tones beside it.
+        QVERIFY(writeTree(tones() + "/tones", { "bell.ogg", "alarm.ogg" }, "OggS"));
         QVERIFY(write(tones() + "/tones.index", R"({"files": [{"fileName": "bell.ogg", "displayName": "Bell", "category": "Default"},
                       {"fileName": "alarm.ogg", "displayName": "Alarm", "category": "Ringtone"}]})"));
         // Outside the watched and install paths: for index and install.
@@ -293,7 +298,7 @@ private slots:
               "\nactive: false\n$" }, "^$");
         row("show themelet by id", { "show", "%T", "--json" }, 0, { "type=themelet", "url=file://%P/sunset.themelet" }, "^$");
         row("show photo", { "show", "%H/photo1.jpg", "--json" }, 0, { "type=photo", "dateTaken=2014-05-03T12:00:00" }, "^$");
-        row("show tone by url", { "show", "file://%S/sysroot/usr/share/sounds/classic/bell.ogg", "--json" }, 0,
+        row("show tone by url", { "show", "file://%S/sysroot/usr/share/sounds/classic/tones/bell.ogg", "--json" }, 0,
             { "type=file", "displayName=Bell", "category=Default", "readOnly=true" }, "^$");
         row("show unknown", { "show", "%H/none.jpg" }, 1, { "^$" }, "^themeletctl: not in the index: %H/none.jpg\n$");
         row("show unknown id", { "show", "999999" }, 1, { "^$" }, "^themeletctl: not in the index: 999999\n$");
@@ -317,7 +322,7 @@ private slots:
         };
         const QStringList none { "^$" };
         const QStringList showSunset { "show", "--json", "%P/sunset.themelet" };
-        step("create", { "create", "%H/photo1.jpg" }, 0, { "^Created themelet \\d+: photo1 \\(/.*\\.themelet\\)\n$" }, "^$",
+        step("create", { "create", "%H/photo1.jpg" }, 0, { "^Created themelet \\d+: photo1 \\(/.*/photo1[^/]*\\.jpg\\)\n$" }, "^$",
              { "status", "--json" }, { "counts.themelets=2" });
         step("create json", { "create", "--json", "%H/photo2.jpg" }, 0, { "type=themelet", "displayName=photo2", "readOnly=false" },
              "^$");
@@ -334,8 +339,8 @@ private slots:
              "^themeletctl: no themelet has the wallpaper %H/photo3.jpg\n$");
         step("index", { "index", "%S/elsewhere/new.jpg" }, 0, none, "^$",
              { "show", "--json", "%S/elsewhere/new.jpg" }, { "type=photo", "width=64" });
-        step("remove by path", { "remove", "file", "%S/elsewhere/new.jpg" }, 0, none, "^$",
-             { "show", "--json", "%S/elsewhere/new.jpg" }, { "exit=1" });
+        step("remove created", { "remove", "themelet", "%C" }, 0, none, "^$", { "show", "--json", "%C" }, { "exit=1" });
+        step("remove file", { "remove", "file", "%S/elsewhere/new.jpg" }, 1, none, "^themeletctl: Content \\d+ of type 0 cannot be removed\n$");
         step("remove package themelet", { "remove", "themelet", "%T" }, 1, none, "^themeletctl: .+\n$", showSunset, { "exit=0" });
         step("remove unknown type", { "remove", "99", "1" }, 1, none, "^themeletctl: Unknown content type 99\n$");
         step("install", { "install", "%S/extra" }, 0, none, "^$", { "show", "--json", "%S/extra/extra.themelet" },
@@ -378,7 +383,7 @@ private slots:
 
         const Result status = ctl({ "status", "--json" });
         QCOMPARE(status.exitCode, 1);
-        QVERIFY(failedCheck(status, { "service.running=false", "database.schemaVersion=12", "counts.themelets=4" }).isEmpty());
+        QVERIFY(failedCheck(status, { "service.running=false", "database.schemaVersion=12", "counts.themelets=3" }).isEmpty());
         QCOMPARE(ctl({ "list", "themelets" }).exitCode, 0);
     }
 };
