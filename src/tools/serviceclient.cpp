@@ -11,6 +11,18 @@ const QString ServiceClient::s_interface = QStringLiteral("com.vorka.themeletd")
 namespace {
 // Creating a themelet copies and reads a picture; allow for a slow disk.
 const int CallTimeout = 120000;
+const int MaxMessageLength = 300;
+
+// Text from the bus reaches a terminal: no control characters, no new lines.
+QString oneLine(const QString &text)
+{
+    QString line = text.left(MaxMessageLength);
+    for (QChar &c : line) {
+        if (c.category() == QChar::Other_Control)
+            c = QLatin1Char(' ');
+    }
+    return line.trimmed();
+}
 }
 
 ServiceClient::ServiceClient()
@@ -55,7 +67,7 @@ bool ServiceClient::call(const QString &method, const QVariantList &arguments,
     message.setArguments(arguments);
     const QDBusMessage answer = m_bus.call(message, QDBus::Block, CallTimeout);
     if (answer.type() == QDBusMessage::ErrorMessage) {
-        m_error = answer.errorMessage().isEmpty() ? answer.errorName() : answer.errorMessage();
+        m_error = oneLine(answer.errorMessage().isEmpty() ? answer.errorName() : answer.errorMessage());
         return false;
     }
     if (answer.type() != QDBusMessage::ReplyMessage) {
@@ -65,7 +77,7 @@ bool ServiceClient::call(const QString &method, const QVariantList &arguments,
     if (!replySignature.isEmpty()) {
         if (answer.signature() != replySignature) {
             m_error = QStringLiteral("unexpected reply from themeletd to ") + method
-                    + QStringLiteral(": signature '") + answer.signature()
+                    + QStringLiteral(": signature '") + oneLine(answer.signature())
                     + QStringLiteral("' instead of '") + replySignature + QLatin1Char('\'');
             return false;
         }

@@ -3,6 +3,8 @@
 #include "indexfixture.h"
 #include "sysroot.h"
 
+#include <QDBusConnection>
+#include <QDBusContext>
 #include <QJsonArray>
 #include <QJsonDocument>
 #include <QJsonObject>
@@ -38,9 +40,15 @@ Result ctl(const QStringList &arguments, const QProcessEnvironment &environment 
 {
     QProcess process;
     process.setProcessEnvironment(environment);
+    // An event loop, not waitForFinished: a fake service in this process must answer.
+    QEventLoop loop;
+    QObject::connect(&process, QOverload<int, QProcess::ExitStatus>::of(&QProcess::finished), &loop, &QEventLoop::quit);
+    QObject::connect(&process, &QProcess::errorOccurred, &loop, &QEventLoop::quit);
+    QTimer::singleShot(60000, &loop, &QEventLoop::quit);
     process.start(QStringLiteral(THEMELETCTL), arguments);
+    loop.exec();
     Result result;
-    if (!process.waitForFinished(60000)) {
+    if (process.state() != QProcess::NotRunning) {
         process.kill();
         process.waitForFinished();
         return result;
@@ -93,6 +101,21 @@ QString failedCheck(const Result &result, const QStringList &checks)
 }
 
 }
+
+// Owns the service's name and answers what no real themeletd would.
+class HostileService : public QObject, protected QDBusContext
+{
+    Q_OBJECT
+    Q_CLASSINFO("D-Bus Interface", "com.vorka.themeletd")
+
+public slots:
+    QString setThemelet(const QString &) { return QStringLiteral("not an id"); }
+    int setFavorite(const QString &, bool) { return 7; }
+    void refreshThemelets()
+    {
+        sendErrorReply(QStringLiteral("com.vorka.themeletd.Error.Failed"), QStringLiteral("first\nsecond\x1b[2J"));
+    }
+};
 
 class TestThemeletctl : public QObject
 {
@@ -265,6 +288,27 @@ private slots:
         const Result result = ctl({ "refresh" }, environment);
         QCOMPARE(result.exitCode, 1);
         QVERIFY2(result.err.startsWith("themeletctl: no D-Bus session bus: ") && result.err.count('\n') == 1, qPrintable(result.err));
+    }
+
+    void hostileService_data()
+    {
+        addColumns();
+        row("wrong reply type", { "set", "/x.themelet" }, 1, { "^$" },
+            "^themeletctl: unexpected reply from themeletd to setThemelet: signature 's' instead of 'x'\n$");
+        row("wrong reply type b", { "favorite", "/x.jpg", "on" }, 1, { "^$" }, "signature 'i' instead of 'b'\n$");
+        row("error text is one line", { "refresh" }, 1, { "^$" }, "^themeletctl: first second \\[2J\n$");
+        row("unknown method", { "install", "/x" }, 1, { "^$" }, "^themeletctl: .+\n$");
+    }
+
+    void hostileService()
+    {
+        QDBusConnection bus = QDBusConnection::sessionBus();
+        HostileService service;
+        QVERIFY(bus.registerObject(QStringLiteral("/com/vorka/themeletd"), &service, QDBusConnection::ExportAllSlots));
+        QVERIFY(bus.registerService(QStringLiteral("com.vorka.themeletd")));
+        verifyRow();
+        bus.unregisterService(QStringLiteral("com.vorka.themeletd"));
+        bus.unregisterObject(QStringLiteral("/com/vorka/themeletd"));
     }
 
     void startService()
