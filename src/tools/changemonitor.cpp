@@ -2,9 +2,9 @@
 
 #include "contentprinter.h"
 #include "serviceclient.h"
+#include "themeletinterface.h"
 
 #include <QCoreApplication>
-#include <QDBusError>
 #include <QDBusServiceWatcher>
 #include <QJsonObject>
 
@@ -17,18 +17,11 @@ ChangeMonitor::ChangeMonitor(ServiceClient &client, bool json, QObject *parent)
 
 int ChangeMonitor::run()
 {
-    QDBusConnection bus = m_client.connection();
-    QDBusServiceWatcher watcher(ServiceClient::s_service, bus,
+    QDBusServiceWatcher watcher(ServiceClient::serviceName(), m_client.connection(),
                                 QDBusServiceWatcher::WatchForUnregistration);
     connect(&watcher, &QDBusServiceWatcher::serviceUnregistered, this, &ChangeMonitor::serviceLeft);
-    // Bound to the name's owner, so nobody else can speak for the service.
-    if (!bus.connect(ServiceClient::s_service, ServiceClient::s_path, ServiceClient::s_interface,
-                     QStringLiteral("contentChanged"), QStringLiteral("i"),
-                     this, SLOT(contentChanged(int)))) {
-        ContentPrinter::printError(QStringLiteral("cannot subscribe to contentChanged: ")
-                                   + bus.lastError().message());
-        return 1;
-    }
+    // The proxy's signal is bound to the name's owner: nobody else can speak for the service.
+    connect(m_client.proxy(), &ThemeletInterface::contentChanged, this, &ChangeMonitor::contentChanged);
     // Asked after subscribing: the bus handles our messages in order, so no
     // signal sent after this answer is missed.
     if (!m_client.isRunning()) {

@@ -1,6 +1,7 @@
 #include "controltool.h"
 
 #include "changemonitor.h"
+#include "themeletinterface.h"
 #include "themeletsettings.h"
 
 #include <QCommandLineParser>
@@ -157,10 +158,9 @@ bool ControlTool::serviceMissing()
     return true;
 }
 
-int ControlTool::call(const QString &method, const QVariantList &arguments, const QString &replySignature,
-                      QVariant *reply)
+int ControlTool::finish(const QDBusPendingCall &call)
 {
-    if (!m_service.call(method, arguments, replySignature, reply))
+    if (!m_service.wait(call))
         return failure(m_service.errorString());
     return Success;
 }
@@ -305,20 +305,22 @@ int ControlTool::set(const QStringList &arguments)
     QUrl url;
     if (serviceMissing() || !urlOf(arguments.first(), &url))
         return Failure;
-    QVariant id;
-    if (const int code = call(QStringLiteral("setThemelet"), { url.toString() }, QStringLiteral("x"), &id))
+    const QDBusPendingReply<qlonglong> reply = m_service.proxy()->setThemelet(url.toString());
+    if (const int code = finish(reply))
         return code;
-    printThemelet(QStringLiteral("Active"), id.toLongLong());
+    printThemelet(QStringLiteral("Active"), reply.value());
     return Success;
 }
 
 int ControlTool::create(const QStringList &arguments)
 {
+    if (serviceMissing())
+        return Failure;
     const QUrl url = urlFromArgument(arguments.first());
-    QVariant id;
-    if (const int code = call(QStringLiteral("createThemelet"), { url.toString() }, QStringLiteral("x"), &id))
+    const QDBusPendingReply<qlonglong> reply = m_service.proxy()->createThemelet(url.toString());
+    if (const int code = finish(reply))
         return code;
-    printThemelet(QStringLiteral("Created"), id.toLongLong());
+    printThemelet(QStringLiteral("Created"), reply.value());
     return Success;
 }
 
@@ -342,34 +344,37 @@ int ControlTool::favorite(const QStringList &arguments)
                                                           : m_index.find(urlFromArgument(arguments.first()));
     if (themelet.type() == ThemeletContent::Themelet) {
         const QVariantMap attributes { { QStringLiteral("favorite"), on } };
-        return call(QStringLiteral("saveAttributes"),
-                    { int(ThemeletContent::Themelet), themelet.data()->id, attributes });
+        return finish(m_service.proxy()->saveAttributes(ThemeletContent::Themelet, themelet.data()->id, attributes));
     }
     if (id)
         return failure(QStringLiteral("no themelet with id ") + arguments.first());
-    QVariant changed;
-    if (const int code = call(QStringLiteral("setFavorite"),
-                              { urlFromArgument(arguments.first()).toString(), on }, QStringLiteral("b"), &changed))
+    const QDBusPendingReply<bool> changed = m_service.proxy()->setFavorite(urlFromArgument(arguments.first()).toString(), on);
+    if (const int code = finish(changed))
         return code;
-    if (!changed.toBool())
+    if (!changed.value())
         return failure(QStringLiteral("no themelet has the wallpaper ") + arguments.first());
     return Success;
 }
 
 int ControlTool::install(const QStringList &arguments)
 {
-    return call(QStringLiteral("installPackage"),
-                { QDir::cleanPath(QFileInfo(arguments.first()).absoluteFilePath()) });
+    if (serviceMissing())
+        return Failure;
+    return finish(m_service.proxy()->installPackage(QDir::cleanPath(QFileInfo(arguments.first()).absoluteFilePath())));
 }
 
 int ControlTool::index(const QStringList &arguments)
 {
-    return call(QStringLiteral("indexFile"), { urlFromArgument(arguments.first()).toString() });
+    if (serviceMissing())
+        return Failure;
+    return finish(m_service.proxy()->indexFile(urlFromArgument(arguments.first()).toString()));
 }
 
 int ControlTool::refresh(const QStringList &)
 {
-    return call(QStringLiteral("refreshThemelets"), {});
+    if (serviceMissing())
+        return Failure;
+    return finish(m_service.proxy()->refreshThemelets());
 }
 
 int ControlTool::remove(const QStringList &arguments)
@@ -388,7 +393,7 @@ int ControlTool::remove(const QStringList &arguments)
             return Failure;
         id = content.data()->id;
     }
-    return call(QStringLiteral("remove"), { type, id });
+    return finish(m_service.proxy()->remove(type, id));
 }
 
 int ControlTool::monitor(const QStringList &)
@@ -409,7 +414,7 @@ int ControlTool::status(const QStringList &)
     const QUrl active = activeSource();
 
     if (m_json) {
-        QJsonObject service { { QStringLiteral("name"), ServiceClient::s_service },
+        QJsonObject service { { QStringLiteral("name"), ServiceClient::serviceName() },
                               { QStringLiteral("running"), running } };
         if (pid)
             service.insert(QStringLiteral("pid"), double(pid));

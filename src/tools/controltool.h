@@ -5,6 +5,7 @@
 #include "indexreader.h"
 #include "serviceclient.h"
 
+#include <QDBusPendingCall>
 #include <QStringList>
 #include <QUrl>
 
@@ -39,9 +40,8 @@ private:
     int failure(const QString &message);
     // Prints why when themeletd isn't there; writes ask before they look anything up.
     bool serviceMissing();
-    // A call of themeletd; prints its error on failure.
-    int call(const QString &method, const QVariantList &arguments, const QString &replySignature = QString(),
-             QVariant *reply = nullptr);
+    // The exit code of a call of themeletd; prints its error.
+    int finish(const QDBusPendingCall &call);
 
     // An id or a URL, a path standing for its file URL.
     static bool isId(const QString &argument, qint64 *id);

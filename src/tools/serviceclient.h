@@ -2,36 +2,34 @@
 #define SERVICECLIENT_H
 
 #include <QDBusConnection>
+#include <QDBusPendingCall>
 #include <QString>
-#include <QVariant>
 
-// Calls of themeletd on the session bus. Whatever comes back is checked
-// against the interface, since anything on the bus may be hostile.
+class ThemeletInterface;
+
+// themeletd as a command-line client needs it: is it there, and the replies
+// of the process-wide proxy waited for, with their errors as one line.
 class ServiceClient
 {
 public:
-    static const QString s_service;
-    static const QString s_path;
-    static const QString s_interface;
-
-    ServiceClient();
+    static QString serviceName();
 
     // Asks the bus who owns the name; never starts the service by activation.
     bool isRunning();
     // 0 when unknown.
     uint pid();
 
-    // Blocks until the reply. With a non-empty replySignature the reply must
-    // carry exactly that; its first argument goes to *reply.
-    bool call(const QString &method, const QVariantList &arguments,
-              const QString &replySignature = QString(), QVariant *reply = nullptr);
+    ThemeletInterface *proxy() const;
+    QDBusConnection connection() const;
 
-    QDBusConnection connection() const { return m_bus; }
+    // Blocks until the reply; false when it is an error, also one of a typed
+    // reply whose arguments don't match.
+    bool wait(QDBusPendingCall call);
+
     // One line, for the user.
     QString errorString() const { return m_error; }
 
 private:
-    QDBusConnection m_bus;
     QString m_error;
 };
 

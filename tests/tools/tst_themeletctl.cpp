@@ -294,8 +294,8 @@ private slots:
     {
         addColumns();
         row("wrong reply type", { "set", "/x.themelet" }, 1, { "^$" },
-            "^themeletctl: unexpected reply from themeletd to setThemelet: signature 's' instead of 'x'\n$");
-        row("wrong reply type b", { "favorite", "/x.jpg", "on" }, 1, { "^$" }, "signature 'i' instead of 'b'\n$");
+            "^themeletctl: Unexpected reply signature: got \"s\", expected \"x\"\n$");
+        row("wrong reply type b", { "favorite", "/x.jpg", "on" }, 1, { "^$" }, "got \"i\", expected \"b\"\n$");
         row("error text is one line", { "refresh" }, 1, { "^$" }, "^themeletctl: first second \\[2J\n$");
         row("unknown method", { "install", "/x" }, 1, { "^$" }, "^themeletctl: .+\n$");
     }
