@@ -1,7 +1,6 @@
 // themeletctl end to end: the real client against the real themeletd on the
 // sandbox's private bus, over a package, a tone pack and a Pictures folder.
 #include "indexfixture.h"
-#include "sysroot.h"
 
 #include <QDBusConnection>
 #include <QDBusContext>
@@ -100,6 +99,21 @@ QString failedCheck(const Result &result, const QStringList &checks)
     return QString();
 }
 
+// Runs a read until its JSON passes the checks, as writes take effect in the
+// service's loops; the last failure, or an empty string.
+QString waitFor(QStringList arguments, const QStringList &checks)
+{
+    for (QString &argument : arguments)
+        argument = expand(argument);
+    QString failed;
+    QElapsedTimer timer;
+    for (timer.start(); !timer.hasExpired(30000); QTest::qWait(100)) {
+        if ((failed = failedCheck(ctl(arguments), checks)).isEmpty())
+            break;
+    }
+    return failed.isEmpty() ? failed : arguments.join(' ') + ": " + failed;
+}
+
 }
 
 // Owns the service's name and answers what no real themeletd would.
@@ -123,29 +137,13 @@ class TestThemeletctl : public QObject
 
     QProcess m_service;
 
-    bool indexSettled()
-    {
-        const Result status = ctl({ "status", "--json" });
-        const QJsonObject object = QJsonDocument::fromJson(status.out.toUtf8()).object();
-        const QJsonObject counts = object.value("counts").toObject();
-        return status.exitCode == 0 && counts.value("pending").toInt(-1) == 0 && counts.value("photos").toInt() == 3
-                && counts.value("themelets").toInt() == 1 && counts.value("tones").toInt() == 3;
-    }
-
     bool launchService()
     {
         m_service.setProcessChannelMode(QProcess::ForwardedChannels);
         m_service.start(QStringLiteral(THEMELETD), { "--no-default-watch", "--watch", pictures() });
-        if (!m_service.waitForStarted())
-            return false;
-        QElapsedTimer timer;
-        timer.start();
-        while (!indexSettled()) {
-            if (timer.hasExpired(60000) || m_service.state() != QProcess::Running)
-                return false;
-            QTest::qWait(100);
-        }
-        return true;
+        return m_service.waitForStarted()
+                && waitFor({ "status", "--json" }, { "exit=0", "counts.pending=0", "counts.photos=3", "counts.themelets=1",
+                                                     "counts.tones=3" }).isEmpty();
     }
 
     // Until the monitor prints its first line: changes are made until one is
@@ -167,8 +165,7 @@ class TestThemeletctl : public QObject
 
     // Each row: arguments, exit code, patterns that stdout must each match (or
     // "path=value" JSON checks with --json), a pattern for stderr; then a read
-    // whose JSON must come to pass the checks, as writes take effect in the
-    // service's loops.
+    // whose JSON must come to pass the checks.
     void addColumns()
     {
         QTest::addColumn<QStringList>("arguments");
@@ -209,14 +206,8 @@ class TestThemeletctl : public QObject
         QFETCH(QStringList, thenChecks);
         if (then.isEmpty())
             return;
-        for (QString &argument : then)
-            argument = expand(argument);
-        QString failed;
-        for (timer.start(); !timer.hasExpired(20000); QTest::qWait(100)) {
-            if ((failed = failedCheck(ctl(then), thenChecks)).isEmpty())
-                return;
-        }
-        QFAIL(qPrintable(then.join(' ') + ": " + failed));
+        const QString failed = waitFor(then, thenChecks);
+        QVERIFY2(failed.isEmpty(), qPrintable(failed));
     }
 
     // A row with no follow-up read.
