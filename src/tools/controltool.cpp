@@ -411,6 +411,8 @@ int ControlTool::status(const QStringList &)
     IndexReader::Counts counts;
     int version = 0;
     const bool readable = exists && m_index.statistics(&counts, &version);
+    if (exists && !readable)
+        ContentPrinter::printError(m_index.errorString());
     const QUrl active = activeSource();
 
     if (m_json) {

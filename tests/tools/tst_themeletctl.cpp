@@ -281,6 +281,18 @@ private slots:
         QVERIFY2(result.err.startsWith("themeletctl: no D-Bus session bus: ") && result.err.count('\n') == 1, qPrintable(result.err));
     }
 
+    void brokenIndex()
+    {
+        QVERIFY(write(TestDatabase::indexPath(), "not a database"));
+        const Result list = ctl({ "list", "themelets" }), status = ctl({ "status" });
+        QVERIFY(QFile::remove(TestDatabase::indexPath()));
+        QCOMPARE(list.exitCode, 1);
+        QCOMPARE(list.err, "themeletctl: cannot open the index at " + TestDatabase::indexPath() + '\n');
+        QCOMPARE(status.exitCode, 1);
+        QCOMPARE(status.err, list.err);
+        QVERIFY2(status.out.contains(TestDatabase::indexPath() + " (unreadable)\n"), qPrintable(status.out));
+    }
+
     void hostileService_data()
     {
         addColumns();
