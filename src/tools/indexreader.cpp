@@ -45,7 +45,9 @@ QueryAgent *IndexReader::agent(ThemeletContent::Type type)
         return nullptr;
     }
     QueryAgent *agent = QueryAgent::agentFor(type);
-    if (!agent)
+    if (agent)
+        m_error.clear();
+    else
         m_error = QStringLiteral("cannot open the index at ") + databasePath();
     return agent;
 }
@@ -91,25 +93,25 @@ Content IndexReader::asPhoto(const Content &file)
 
 Content IndexReader::find(qint64 id)
 {
-    QueryAgent *themelets = agent(ThemeletContent::Themelet);
-    if (!themelets)
-        return Content();
-    const Content themelet = themelets->queryById(id);
-    if (themelet.isValid())
-        return themelet;
-    const Content file = agent(ThemeletContent::File)->queryById(id);
-    return file.isValid() ? asPhoto(file) : file;
+    return find([id](QueryAgent *agent) { return agent->queryById(id); });
 }
 
 Content IndexReader::find(const QUrl &url)
 {
+    return find([&url](QueryAgent *agent) { return agent->queryByUrl(url); });
+}
+
+template <typename Lookup>
+Content IndexReader::find(Lookup lookup)
+{
     QueryAgent *themelets = agent(ThemeletContent::Themelet);
     if (!themelets)
         return Content();
-    const Content themelet = themelets->queryByUrl(url);
+    const Content themelet = lookup(themelets);
     if (themelet.isValid())
         return themelet;
-    const Content file = agent(ThemeletContent::File)->queryByUrl(url);
+    QueryAgent *files = agent(ThemeletContent::File);
+    const Content file = files ? lookup(files) : Content();
     return file.isValid() ? asPhoto(file) : file;
 }
 

@@ -33,6 +33,9 @@ public:
 
 private:
     QueryAgent *agent(ThemeletContent::Type type);
+    // Through the themelet agent, else the file agent.
+    template <typename Lookup>
+    Content find(Lookup lookup);
     // A file that is an indexed image comes back as its photo record.
     Content asPhoto(const Content &file);
     bool count(const QString &statement, qint64 *value);
