@@ -15,26 +15,25 @@ struct ControlTool::Command
 {
     const char *name;
     const char *synopsis;
-    int minArguments;
-    int maxArguments;
+    int argumentCount;
     const char *summary;
     int (ControlTool::*handler)(const QStringList &);
 };
 
 const ControlTool::Command ControlTool::s_commands[] = {
-    { "list", "themelets|photos|tones", 1, 1, "list the index", &ControlTool::list },
-    { "show", "ID|URL", 1, 1, "one indexed item with all its fields", &ControlTool::show },
-    { "set", "ID|URL", 1, 1, "make a themelet the active one", &ControlTool::set },
-    { "create", "PICTURE", 1, 1, "create a themelet from a picture", &ControlTool::create },
-    { "favorite", "ID|URL on|off", 2, 2, "mark or unmark a favourite themelet", &ControlTool::favorite },
-    { "install", "DIR", 1, 1, "install the package in a directory", &ControlTool::install },
-    { "index", "FILE", 1, 1, "have one file indexed", &ControlTool::index },
-    { "refresh", "", 0, 0, "rescan the installed themelets", &ControlTool::refresh },
-    { "remove", "TYPE ID|URL", 2, 2, "delete an item; TYPE is file, themelet, photo or a number",
+    { "list", "themelets|photos|tones", 1, "list the index", &ControlTool::list },
+    { "show", "ID|URL", 1, "one indexed item with all its fields", &ControlTool::show },
+    { "set", "ID|URL", 1, "make a themelet the active one", &ControlTool::set },
+    { "create", "PICTURE", 1, "create a themelet from a picture", &ControlTool::create },
+    { "favorite", "ID|URL on|off", 2, "mark or unmark a favourite themelet", &ControlTool::favorite },
+    { "install", "DIR", 1, "install the package in a directory", &ControlTool::install },
+    { "index", "FILE", 1, "have one file indexed", &ControlTool::index },
+    { "refresh", "", 0, "rescan the installed themelets", &ControlTool::refresh },
+    { "remove", "TYPE ID|URL", 2, "delete an item; TYPE is file, themelet, photo or a number",
       &ControlTool::remove },
-    { "monitor", "", 0, 0, "print each contentChanged of the service until it stops",
+    { "monitor", "", 0, "print each contentChanged of the service until it stops",
       &ControlTool::monitor },
-    { "status", "", 0, 0, "service, index file, schema version and row counts", &ControlTool::status },
+    { "status", "", 0, "service, index file, schema version and row counts", &ControlTool::status },
 };
 
 namespace {
@@ -127,7 +126,7 @@ int ControlTool::run(const QStringList &arguments)
     for (const Command &command : s_commands) {
         if (name != QLatin1String(command.name))
             continue;
-        if (positional.size() < command.minArguments || positional.size() > command.maxArguments) {
+        if (positional.size() != command.argumentCount) {
             return usageError(QStringLiteral("usage: themeletctl ") + name
                               + QString::fromLatin1(*command.synopsis ? " " : "")
                               + QString::fromLatin1(command.synopsis));
