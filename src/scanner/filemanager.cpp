@@ -379,7 +379,7 @@ bool FileManager::readEvent()
             m_fileIdQuery.bindValue(1, name);
             if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
                 m_fileIdQuery.finish();
-                updateTimes << info.lastModified();
+                updateTimes << modificationTime(info);
                 updateDirectories << directory.id;
                 updateNames << name;
             } else {
@@ -387,13 +387,13 @@ bool FileManager::readEvent()
                 insertDirectories << directory.id;
                 insertTypes << m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name();
                 insertNames << name;
-                insertTimes << info.lastModified();
+                insertTimes << modificationTime(info);
             }
         } else if (header.mask & LeftMask) {
             deleteDirectories << directory.id;
             deleteNames << name;
         } else if (header.mask & IN_MODIFY) {
-            updateTimes << QFileInfo(path).lastModified();
+            updateTimes << modificationTime(QFileInfo(path));
             updateDirectories << directory.id;
             updateNames << name;
         }
@@ -445,7 +445,7 @@ bool FileManager::scanDirectory()
         if (!info.isDir()) {
             // Also a link to a file: its own name, its target's time.
             const QString fileName = info.fileName();
-            files.append({ fileName.toUtf8(), entryPath, fileName, info.lastModified() });
+            files.append({ fileName.toUtf8(), entryPath, fileName, modificationTime(info) });
         } else if (!info.isSymLink()) {
             directories.append({ info.fileName().toUtf8(), entryPath, QString(), QDateTime() });
         }
@@ -608,7 +608,7 @@ qint64 FileManager::insertFile(const QString &path)
         m_fileInsert.bindValue(0, directoryId);
         m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
         m_fileInsert.bindValue(2, info.fileName());
-        m_fileInsert.bindValue(3, info.lastModified());
+        m_fileInsert.bindValue(3, modificationTime(info));
     });
     if (id == 0)
         return 0;

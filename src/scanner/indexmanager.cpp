@@ -169,7 +169,7 @@ bool IndexManager::updateMetaData()
         entry.fileName = fileName;
         entry.displayName = translator.translate(object.value(QStringLiteral("displayName")).toString());
         entry.category = object.value(QStringLiteral("category")).toString();
-        entry.modificationTime = info.lastModified();
+        entry.modificationTime = modificationTime(info);
 
         const QJsonArray aliasArray = object.value(QStringLiteral("aliases")).toArray();
         for (const QJsonValue &alias : aliasArray) {

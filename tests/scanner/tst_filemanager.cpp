@@ -164,11 +164,24 @@ private slots:
 
     void appendDirectory()
     {
+        // Times of both passes through the repeated hour of Helsinki's autumn clock change.
         const QString root = uniquePath();
-        run(root, "touch f");
+        run(root, "touch f; touch -d @1761438600 early; touch -d @1761442200 late");
+        const QByteArray zone = qgetenv("TZ");
+        setTimeZone("Europe/Helsinki");
         FileManager manager(DbManager::instance(), nullptr);
         const qint64 id = manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew);
         QVERIFY(id > 0 && waitIdle());
+
+        // A restart in another zone finds both stored times equal to the files'.
+        m_sql.exec("UPDATE file SET metadataCurrent = 1 WHERE fileName IN ('early', 'late');");
+        setTimeZone("Asia/Tokyo");
+        {
+            FileManager restarted(DbManager::instance(), nullptr);
+            QVERIFY(waitIdle());
+        }
+        setTimeZone(zone);
+        QCOMPARE(tree(root), QString("+early|1 +f|0 +late|1 /"));
         addRows(root, "absent");
 
         QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew), id);
@@ -179,7 +192,7 @@ private slots:
         QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanAlways), id);
         QVERIFY(manager.isUpdateQueued());
         QVERIFY(waitIdle());
-        QCOMPARE(tree(root), QString("/ absent|1 f|0"));
+        QCOMPARE(tree(root), QString("/ absent|1 early|1 f|0 late|1"));
 
         // A new scope without a scan removes the watch; unwatched, ScanAlways scans.
         QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::NoScan), id);
@@ -190,7 +203,7 @@ private slots:
         QCOMPARE(pendingBytes(manager), 0);
         QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::ScanAlways), id);
         QVERIFY(waitIdle());
-        QCOMPARE(tree(root), QString("/ f|0"));
+        QCOMPARE(tree(root), QString("/ early|1 f|0 late|1"));
     }
 
     void insertFile()
