@@ -433,7 +433,7 @@ bool FileManager::scanDirectory()
     const QString path = m_pendingDirectories.takeFirst();
     qint64 id = 0;
     DirectoryScope scope = UserScope;
-    if (!watchDirectory(path, &id, &scope))
+    if (isLinkedDirectory(path) || !watchDirectory(path, &id, &scope))
         return !m_pendingDirectories.isEmpty();
 
     QVector<DiskEntry> files;
@@ -615,6 +615,14 @@ qint64 FileManager::insertFile(const QString &path)
 
     commit();
     return id;
+}
+
+bool FileManager::isLinkedDirectory(const QString &path)
+{
+    if (!QFileInfo(path).isSymLink())
+        return false;
+    qWarning() << "Skipping a directory that is a symbolic link" << path;
+    return true;
 }
 
 FileManager *FileManager::instance()

@@ -130,7 +130,7 @@ bool IndexManager::updateMetaData()
 
     FileManager *files = FileManager::instance();
     const QString directory = indexPath.left(indexPath.size() - 6);
-    const qint64 directoryId = files
+    const qint64 directoryId = files && !FileManager::isLinkedDirectory(directory)
             ? files->appendDirectory(directory, FileManager::IndexScope, FileManager::NoScan)
             : 0;
     if (directoryId == 0)

@@ -129,6 +129,9 @@ private slots:
         const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
         QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
         QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
+        // Swapped for a link between the event that queues it and its scan.
+        QTest::newRow("directory now a link") << Case { 0, "mkdir -p ../outside; touch ../outside/secret", "",
+                "mkdir N; rmdir N; ln -s ../outside N", "/ N/ +N|0", 2, { "^Skipping a directory that is a symbolic link \".*/N\"$" } };
         // The failed watch is reported and the scan goes on, finding nothing.
         QTest::newRow("directory gone before its scan") << Case { 0, "", "", "mkdir N; rmdir N", "/ N/", 3,
                                                                   { "^Failed to add listener -1 \".*/N\"$" } };

@@ -113,6 +113,13 @@ private slots:
         QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db.exec(markStale));
         QVERIFY(indexes->updateMetaData() && !indexes->updateMetaData());
         QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
+        // A described directory that is a link is not followed.
+        const QString outside = uniquePath();
+        QVERIFY(write(outside + QStringLiteral("/b.ogg")) && QDir(tones()).removeRecursively() && QFile::link(outside, tones()));
+        QVERIFY(write(index, R"({"files": [{"fileName": "b.ogg"}]})") && m_db.exec(markStale));
+        QTest::ignoreMessage(QtWarningMsg, qPrintable("Skipping a directory that is a symbolic link \"" + tones() + '"'));
+        QVERIFY(indexes->updateMetaData());
+        QCOMPARE(m_db.fileRows(tones(), "fileName"), QStringList { "a.ogg" });
         QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
         QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
     }
