@@ -2,6 +2,7 @@
 
 #include "content.h"
 #include "filemanager.h"
+#include "packagefile.h"
 #include "queryagentdatabase.h"
 #include "themelettranslator.h"
 
@@ -156,12 +157,10 @@ bool IndexManager::updateMetaData()
         if (object.isEmpty())
             continue;
         const QString fileName = object.value(QStringLiteral("fileName")).toString();
-        if (fileName.isEmpty() || fileName.contains(QLatin1Char('/')))
+        const QString path = PackageFile::regularFile(directory, fileName);
+        if (path.isEmpty())
             continue;
-        const QString path = directory + QLatin1Char('/') + fileName;
         const QFileInfo info(path);
-        if (!info.exists())
-            continue;
 
         Entry entry;
         entry.name = fileName.toUtf8();

@@ -1,5 +1,7 @@
 #include "themeletfile.h"
 
+#include "packagefile.h"
+
 #include <QDateTime>
 #include <QDebug>
 #include <QFile>
@@ -39,12 +41,11 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
     }
     const QJsonObject object = document.object();
 
-    const QString wallpaper = object.value(QLatin1String("wallpaper")).toString();
-    if (wallpaper.isEmpty() || wallpaper.contains(QLatin1Char('/')))
-        return Invalid;
+    // Removing the themelet deletes its wallpaper: it has to be a file of the package.
     this->directory = directory;
-    wallpaperPath = directory + QLatin1String("/images/") + wallpaper;
-    if (!QFile::exists(wallpaperPath))
+    wallpaperPath = PackageFile::fileInside(directory, QStringLiteral("images"),
+                                            object.value(QLatin1String("wallpaper")).toString());
+    if (wallpaperPath.isEmpty())
         return Invalid;
 
     translationCatalog = object.value(QLatin1String("translationCatalog")).toString();
@@ -92,9 +93,9 @@ QString ThemeletFile::tonePath(int tone, const QString &fallback) const
     if (!entry.present)
         return QString();
     if (!entry.file.isEmpty()) {
-        // A path in "file" is refused outright, without falling back.
-        return entry.file.contains(QLatin1Char('/'))
-                ? QString() : directory + QLatin1String("/sounds/") + entry.file;
+        // A path in "file", or a name that isn't a file of the package, is
+        // refused outright, without falling back.
+        return PackageFile::fileInside(directory, QStringLiteral("sounds"), entry.file);
     }
     return entry.enabled != 0 ? fallback : QString();
 }

@@ -54,7 +54,7 @@ private slots:
         add("locale catalogue", { translated }, QStringList("a.ogg|Suomi A|NULL|0") + others, {}, "fi_FI");
         // Wrong types count as absent; "a.ogg" and "./a.ogg" are names, not rows.
         add("skipped elements", { R"({"files": [{"fileName": "b.ogg", "displayName": "B", "category": "x", "more": 1}, 7, )"
-            R"("a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"}, )"
+            R"("a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"}, {"fileName": "."}, {"fileName": ".."}, )"
             R"({"fileName": "a.ogg", "displayName": 5, "category": ["x"]}]})" }, { "a.ogg|NULL|NULL|0", "b.ogg|B|x|0" });
         add("duplicate", { R"({"files": [{"fileName": "c.ogg"}, {"fileName": "a.ogg"}, {"fileName": "c.ogg"}]})" },
             { "a.ogg|NULL|NULL|0", "c.ogg|NULL|NULL|0" },

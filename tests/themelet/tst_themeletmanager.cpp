@@ -31,10 +31,15 @@ class tst_ThemeletManager : public QObject
     ThemeletManager *m_manager = nullptr;
     TestDatabase m_db { serviceIndex() };
 
-    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), unread row.
+    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), images/out.jpg
+    // and sounds/out.ogg linked to a file outside, unread row.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
         writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
+        const QString outside = user("outside");
+        write(outside);
+        QFile::link(outside, package(name) + "/images/out.jpg");
+        QFile::link(outside, package(name) + "/sounds/out.ogg");
         write(package(name) + '/' + name + ".themelet", json);
         m_db.exec({ QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 2)").arg(package(name)),
                     QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) SELECT MAX(id), "
@@ -90,14 +95,16 @@ private slots:
     void translation()
     {
         // One batch in directory order. After a file without a catalogue the same catalogue stays off.
-        const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset" };
+        // A path is no catalogue, even one that leads to the right place.
+        const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset",
+                                     "../translations/themelet-sunset" };
         for (int i = 0; i < catalogs.size(); ++i)
             addThemelet(QString::number(i), QStringLiteral(R"({"wallpaper": "w.jpg", "translationCatalog": "%1", )"
                     R"("displayName": "themelet-la-%2"})").arg(catalogs[i], i == 2 ? "dusk" : "sunset").toUtf8());
         m_manager->updateMetaData();
         QCOMPARE(m_db.rows("SELECT displayName FROM file JOIN themelet ON fileId = id ORDER BY id"), (QStringList {
                 "themelet-la-sunset", "Auringonlasku", "Dusk" /* empty in the locale catalogue */, "themelet-la-sunset",
-                "themelet-la-sunset" }));
+                "themelet-la-sunset", "themelet-la-sunset" }));
         // A new batch starts with nothing remembered.
         m_db.exec("UPDATE file SET metadataCurrent = 0 WHERE fileName = '4.themelet'");
         m_manager->updateMetaData();
@@ -116,6 +123,9 @@ private slots:
         add("only wallpaper", R"("w.jpg")", defaults);
         add("slash in wallpaper", R"("images/w.jpg")", "");
         add("missing wallpaper file", R"("gone.jpg")", "");
+        add("wallpaper ..", R"("..")", "");
+        add("wallpaper a directory", R"("images")", "");
+        add("wallpaper linked out of the package", R"("out.jpg")", "");
         add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|now");
         add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
             R"("timestamp": "2014-05-01T12:00:00.250Z")", "0|150|-1|1|NULL|p|2014-05-01T12:00:00Z");
@@ -128,6 +138,8 @@ private slots:
         add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|now");
         add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
         add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
+        add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
+            R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
         add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
             R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"

@@ -1,0 +1,20 @@
+#ifndef PACKAGEFILE_H
+#define PACKAGEFILE_H
+
+#include <QString>
+
+// Names that package files (.themelet, .index) give for other files. A package
+// may come from anyone: a name leads to a regular file in its place or to none.
+class PackageFile
+{
+public:
+    // A name of one path element: not empty, no "/", not "." or "..".
+    static bool isPlainName(const QString &name);
+    // directory/name if that is a plain name of a regular file, else empty.
+    static QString regularFile(const QString &directory, const QString &name);
+    // Like regularFile in package/subdirectory, and also empty when links lead
+    // the file out of the package.
+    static QString fileInside(const QString &package, const QString &subdirectory, const QString &name);
+};
+
+#endif
