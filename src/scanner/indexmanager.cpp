@@ -8,7 +8,6 @@
 
 #include <QDateTime>
 #include <QDebug>
-#include <QFile>
 #include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -115,15 +114,14 @@ bool IndexManager::updateMetaData()
     }
     m_modifiedReset.finish();
 
-    // Only regular files: opening a FIFO would block the whole loop.
-    QFile file(indexPath);
-    if (!QFileInfo(indexPath).isFile() || !file.open(QIODevice::ReadOnly))
+    QByteArray content;
+    if (!PackageFile::read(indexPath, &content))
         return true;
 
     QJsonParseError error;
-    const QJsonDocument document = QJsonDocument::fromJson(file.readAll(), &error);
+    const QJsonDocument document = QJsonDocument::fromJson(content, &error);
     if (document.isNull() || !document.isObject()) {
-        qWarning() << "Error parsing index from file" << file.fileName() << ", offset:" << error.offset
+        qWarning() << "Error parsing index from file" << indexPath << ", offset:" << error.offset
                    << ", errorString:" << error.errorString();
         return true;
     }

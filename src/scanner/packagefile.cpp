@@ -1,5 +1,7 @@
 #include "packagefile.h"
 
+#include <QDebug>
+#include <QFile>
 #include <QFileInfo>
 
 bool PackageFile::isPlainName(const QString &name)
@@ -23,4 +25,19 @@ QString PackageFile::fileInside(const QString &package, const QString &subdirect
     if (path.isEmpty() || root.isEmpty())
         return QString();
     return QFileInfo(path).canonicalFilePath().startsWith(root + QLatin1Char('/')) ? path : QString();
+}
+
+bool PackageFile::read(const QString &path, QByteArray *content)
+{
+    QFile file(path);
+    if (!QFileInfo(path).isFile() || !file.open(QIODevice::ReadOnly))
+        return false;
+    // Read one byte past the limit: the file may grow after the size was asked.
+    *content = file.size() > MaximumSize ? QByteArray() : file.read(MaximumSize + 1);
+    if (file.size() > MaximumSize || content->size() > MaximumSize) {
+        qWarning() << "Skipping a file of more than" << MaximumSize << "bytes" << path;
+        content->clear();
+        return false;
+    }
+    return true;
 }

@@ -1,6 +1,7 @@
 #ifndef PACKAGEFILE_H
 #define PACKAGEFILE_H
 
+#include <QByteArray>
 #include <QString>
 
 // Names that package files (.themelet, .index) give for other files. A package
@@ -15,6 +16,12 @@ public:
     // Like regularFile in package/subdirectory, and also empty when links lead
     // the file out of the package.
     static QString fileInside(const QString &package, const QString &subdirectory, const QString &name);
+
+    // A package file is a few kilobytes; past this it is not read at all.
+    static const qint64 MaximumSize = 4 * 1024 * 1024;
+    // The whole of a regular file of at most MaximumSize bytes; false, with a
+    // warning if it is too large, when it can't be read. Never blocks on a FIFO.
+    static bool read(const QString &path, QByteArray *content);
 };
 
 #endif

@@ -4,16 +4,11 @@
 
 #include <QDateTime>
 #include <QDebug>
-#include <QFile>
-#include <QFileInfo>
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QJsonParseError>
 
 namespace {
-
-// A themelet is a few hundred bytes; anything past this is cut off and fails to parse.
-constexpr qint64 s_maximumSize = 4 * 1024 * 1024;
 
 QString normalisedTimestamp(const QJsonValue &value, const QString &fallback)
 {
@@ -27,13 +22,13 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
                                         const QString &batchTime)
 {
     const QString path = directory + QLatin1Char('/') + fileName;
-    // Only regular files: opening a FIFO would block the service.
-    QFile file(path);
-    if (!QFileInfo(path).isFile() || !file.open(QIODevice::ReadOnly))
+    // Too large is unreadable, not malformed: the row and the user's edits stay.
+    QByteArray content;
+    if (!PackageFile::read(path, &content))
         return Unreadable;
 
     QJsonParseError error { 0, QJsonParseError::NoError };
-    const QJsonDocument document = QJsonDocument::fromJson(file.read(s_maximumSize), &error);
+    const QJsonDocument document = QJsonDocument::fromJson(content, &error);
     if (document.isNull() || !document.isObject()) {
         qWarning() << "Failed to parse themelet file" << path << ", jsonError:" << int(error.error)
                    << ", jsonOffset:" << error.offset;

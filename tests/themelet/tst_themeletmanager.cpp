@@ -172,6 +172,12 @@ private slots:
         QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
         QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
                                    << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
+        // Valid, but too large to be read: unreadable like a missing file, not malformed.
+        QTest::newRow("too large, with a row") << QByteArray(R"({"wallpaper": "w.jpg"})").append(4 << 20, ' ') << 41
+                << QStringList { "^Skipping a file of more than 4194304 bytes \"" + QRegularExpression::escape(package("bad")) + "/bad\\.themelet\"$" }
+                        + failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
+                                  "INSERT INTO themelet ( fileId,")
+                << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
         QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
         // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
         QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
