@@ -393,6 +393,14 @@ private slots:
         data->displayName = "Moved";
         QCOMPARE(m_manager->create(themelet), id);
         QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
+        // A url that names no local file moves nothing.
+        for (const QUrl &url : { QUrl(), QUrl("http://example.com/moved.themelet") }) {
+            data->url = url;
+            QTest::ignoreMessage(QtWarningMsg, "qint64 ThemeletManager::create(const Themelet&)");
+            QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id).arg(url.toString())));
+            QCOMPARE(m_manager->create(themelet), 0);
+        }
+        QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
         // Nothing to act on: no themelet, no file, an unknown id.
         QCOMPARE(m_manager->create(Themelet()) + m_manager->create(Themelet(new ThemeletData(0, QUrl::fromLocalFile(user("gone"))))), 0);
         QTest::ignoreMessage(QtWarningMsg, "12345 is not an existing themelet");
