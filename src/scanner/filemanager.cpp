@@ -352,12 +352,16 @@ bool FileManager::readEvent()
         QString name;
         if (header.len > 0) {
             const QByteArray bytes(nameBytes, int(strnlen(nameBytes, nameSize)));
-            name = QString::fromUtf8(bytes);
+            // Decoded as part of the whole path, as a scan's listing does: a name
+            // alone would lose a leading U+FEFF as a byte order mark.
+            const QByteArray pathBytes = QFile::encodeName(directory.path) + bytes;
+            const QString decoded = QFile::decodeName(pathBytes);
             // A scan never lists such names, and the decoded path wouldn't lead back to the file.
-            if (name.toUtf8() != bytes) {
+            if (QFile::encodeName(decoded) != pathBytes || !decoded.startsWith(directory.path)) {
                 qWarning() << "Skipping a file name that is not valid UTF-8" << directory.path << bytes;
                 continue;
             }
+            name = decoded.mid(directory.path.size());
         }
         const QString path = directory.path + name;
 
