@@ -145,7 +145,7 @@ bool IndexManager::updateMetaData()
 
     // A null suffix: Qt's default, so the locale's catalogues end in ".qm".
     ThemeletTranslator translator{QString()};
-    translator.selectCatalog(root.value(QStringLiteral("translationCatalog")).toString());
+    translator.selectCatalog(PackageFile::text(root.value(QStringLiteral("translationCatalog"))));
 
     QVector<Entry> entries;
     QVector<QPair<QString, QString>> aliases;
@@ -154,7 +154,7 @@ bool IndexManager::updateMetaData()
         const QJsonObject object = value.toObject();
         if (object.isEmpty())
             continue;
-        const QString fileName = object.value(QStringLiteral("fileName")).toString();
+        const QString fileName = PackageFile::text(object.value(QStringLiteral("fileName")));
         const QString path = PackageFile::regularFile(directory, fileName);
         if (path.isEmpty())
             continue;
@@ -164,13 +164,13 @@ bool IndexManager::updateMetaData()
         entry.name = fileName.toUtf8();
         entry.path = path;
         entry.fileName = fileName;
-        entry.displayName = translator.translate(object.value(QStringLiteral("displayName")).toString());
-        entry.category = object.value(QStringLiteral("category")).toString();
+        entry.displayName = translator.translate(PackageFile::text(object.value(QStringLiteral("displayName"))));
+        entry.category = PackageFile::text(object.value(QStringLiteral("category")));
         entry.modificationTime = modificationTime(info);
 
         const QJsonArray aliasArray = object.value(QStringLiteral("aliases")).toArray();
         for (const QJsonValue &alias : aliasArray) {
-            const QString oldName = alias.toString();
+            const QString oldName = PackageFile::text(alias);
             if (!oldName.isEmpty())
                 aliases.append(qMakePair(oldName, fileName));
         }

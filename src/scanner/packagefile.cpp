@@ -41,3 +41,16 @@ bool PackageFile::read(const QString &path, QByteArray *content)
     }
     return true;
 }
+
+QString PackageFile::text(const QJsonValue &value)
+{
+    QString text = value.toString();
+    for (int i = 0; i < text.size(); ++i) {
+        const QChar c = text.at(i);
+        if (c.isHighSurrogate() && i + 1 < text.size() && text.at(i + 1).isLowSurrogate())
+            ++i;
+        else if (c.isSurrogate())
+            text[i] = QChar::ReplacementCharacter;
+    }
+    return text;
+}

@@ -2,6 +2,7 @@
 #define PACKAGEFILE_H
 
 #include <QByteArray>
+#include <QJsonValue>
 #include <QString>
 
 // Names that package files (.themelet, .index) give for other files. A package
@@ -16,6 +17,10 @@ public:
     // Like regularFile in package/subdirectory, and also empty when links lead
     // the file out of the package.
     static QString fileInside(const QString &package, const QString &subdirectory, const QString &name);
+
+    // The string of a JSON value, null if it is none. JSON escapes can make
+    // unpaired surrogates, which no encoding can store: each becomes U+FFFD.
+    static QString text(const QJsonValue &value);
 
     // A package file is a few kilobytes; past this it is not read at all.
     static const qint64 MaximumSize = 4 * 1024 * 1024;

@@ -39,20 +39,20 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
     // Removing the themelet deletes its wallpaper: it has to be a file of the package.
     this->directory = directory;
     wallpaperPath = PackageFile::fileInside(directory, QStringLiteral("images"),
-                                            object.value(QLatin1String("wallpaper")).toString());
+                                            PackageFile::text(object.value(QLatin1String("wallpaper"))));
     if (wallpaperPath.isEmpty())
         return Invalid;
 
-    translationCatalog = object.value(QLatin1String("translationCatalog")).toString();
+    translationCatalog = PackageFile::text(object.value(QLatin1String("translationCatalog")));
     favorite = object.value(QLatin1String("favorite")).toBool(true);
-    displayName = object.value(QLatin1String("displayName")).toString();
+    displayName = PackageFile::text(object.value(QLatin1String("displayName")));
     highlightColor = object.value(QLatin1String("highlightColor")).toVariant();
     secondaryHighlightColor = object.value(QLatin1String("secondaryHighlightColor")).toVariant();
     primaryColor = object.value(QLatin1String("primaryColor")).toVariant();
     // Plural in the file, singular everywhere else.
     secondaryColor = object.value(QLatin1String("secondaryColors")).toVariant();
     ringerVolume = object.value(QLatin1String("ringerVolume")).toInt(80);
-    partnerSpace = object.value(QLatin1String("partnerSpace")).toString();
+    partnerSpace = PackageFile::text(object.value(QLatin1String("partnerSpace")));
     timestamp = normalisedTimestamp(object.value(QLatin1String("timestamp")), batchTime);
     // A "version" that is there but no whole number is 0, a missing one 1.
     version = object.contains(QLatin1String("version"))
@@ -65,7 +65,7 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
         if (tone.isEmpty())
             continue;
         tones[i].present = true;
-        tones[i].file = tone.value(QLatin1String("file")).toString();
+        tones[i].file = PackageFile::text(tone.value(QLatin1String("file")));
         // Only a number counts: "enabled": false leaves the tone on.
         tones[i].enabled = tone.value(QLatin1String("enabled")).toInt(1);
     }

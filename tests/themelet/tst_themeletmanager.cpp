@@ -140,6 +140,7 @@ private slots:
         add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
         add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
             R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
+        add("unpaired surrogates", R"("w.jpg", "partnerSpace": "a\ud800b\udc00")", "1|80|-1|1|NULL|a\uFFFDb\uFFFD|now");
         add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
             R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"
