@@ -116,6 +116,9 @@ private slots:
                 failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
         // By kind, not in the order of the events: deletes last.
         QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
+        QTest::newRow("IN_MODIFY of a known file") << Case { 0, "touch a b", "a b", "echo x >> a", "/ a|0 b|1", 2 };
+        // The scope 3 watch reports changes only: no new files.
+        QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
         // Scope 1 doesn't add files.
         QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
         QStringList many { "/" };
@@ -133,6 +136,7 @@ private slots:
         const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
         QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
         QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
+        QTest::newRow("IN_MOVE_SELF") << Case { 0, tree, treeRows, "mv S ../moved-S", "/ r|1", 4 }; // and the IN_IGNORED of the removed watch
         // Swapped for a link between the event that queues it and its scan.
         QTest::newRow("directory now a link") << Case { 0, "mkdir -p ../outside; touch ../outside/secret", "",
                 "mkdir N; rmdir N; ln -s ../outside N", "/ N/ +N|0", 2, { "^Skipping a directory that is a symbolic link \".*/N\"$" } };
