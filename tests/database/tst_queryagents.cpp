@@ -261,6 +261,16 @@ private slots:
         for (const Content &missing : { files.queryByUrl(QUrl("http://example.com/other.ogg")), files.queryByUrl(QUrl::fromLocalFile("/d/x.ogg")),
                                         themelets.queryByUrl(url), themelets.queryByUrl(QUrl("http://example.com/t.ogg")) })
             QVERIFY(!missing.isValid());
+
+        // The thread's table name already taken: false, and no batch at all.
+        const QString table = "themelet_" + QString::number(m_database->threadId());
+        QVERIFY(QSqlQuery(*m_database).exec("CREATE TEMPORARY TABLE " + table + " (x)"));
+        MessageLog log(false);
+        Batches none;
+        QVERIFY(!themelets.query(&none, ThemeletQueryAgent::ThemeletParameters()) && none.sizes.isEmpty());
+        QCOMPARE(log.warnings().mid(0, 2), (QStringList { "virtual bool ThemeletQueryAgent::query(QueryAgent::Recipient*, "
+                                                          "const QueryAgent::Parameters&)", "Failed to create themelet table" }));
+        QVERIFY(QSqlQuery(*m_database).exec("DROP TABLE " + table));
     }
 
     void photos()
