@@ -21,6 +21,7 @@ struct Options
 {
     QString screenshot;
     bool tap = false;
+    bool create = false;
     int timeoutMs = 120000;
 };
 
@@ -43,7 +44,7 @@ public:
     }
 
 private:
-    enum Stage { Lists, Tap, Settle };
+    enum Stage { Lists, Tap, Create, Settle };
 
     QObject *model(const char *name) const { return m_window->property(name).value<QObject *>(); }
 
@@ -96,11 +97,24 @@ private:
         QCoreApplication::exit(code);
     }
 
+    // Either make a themelet of the first photo or go on to the grab.
+    void startCreate()
+    {
+        m_stage = Settle;
+        m_settle.start();
+        if (!m_options.create)
+            return;
+        m_themelets = model("themeletModel")->property("count").toInt();
+        m_photo = call("createFromPhoto", 0).toString();
+        m_stage = Create;
+    }
+
     void step()
     {
         if (m_elapsed.hasExpired(m_options.timeoutMs)) {
-            print(m_stage == Tap ? QStringLiteral("timed out: tapping themelet %1 did not make it current").arg(m_tapped)
-                                 : QStringLiteral("timed out waiting for the lists"), stderr);
+            print(m_stage == Tap      ? QStringLiteral("timed out: tapping themelet %1 did not make it current").arg(m_tapped)
+                  : m_stage == Create ? QStringLiteral("timed out: the themelet made from a photo did not show up")
+                                      : QStringLiteral("timed out waiting for the lists"), stderr);
             listsFilled(true);
             finish(1);
             return;
@@ -122,13 +136,22 @@ private:
                 m_tapped = call("themeletUrl", index).toString();
                 click(point);
                 m_stage = Tap;
+                break;
             }
-            m_settle.start();
+            startCreate();
             break;
         case Tap:
             if (m_window->property("activeSource").toString() != m_tapped)
                 return;
             print("tapped " + m_tapped + ", Themelet.source follows");
+            startCreate();
+            break;
+        case Create:
+            if (model("themeletModel")->property("count").toInt() <= m_themelets)
+                return;
+            print(QStringLiteral("created a themelet from %1; the themelet list has %2 rows")
+                          .arg(m_photo)
+                          .arg(model("themeletModel")->property("count").toInt()));
             m_stage = Settle;
             m_settle.start();
             break;
@@ -143,7 +166,8 @@ private:
     QQuickWindow *m_window;
     Options m_options;
     Stage m_stage = Lists;
-    QString m_tapped;
+    QString m_tapped, m_photo;
+    int m_themelets = 0;
     QTimer m_poll;
     QElapsedTimer m_elapsed, m_settle;
 };
@@ -161,10 +185,11 @@ int main(int argc, char *argv[])
     parser.addHelpOption();
     const QCommandLineOption screenshot("screenshot", "Wait until the three lists are filled, save a screenshot to <file>, exit.", "file");
     const QCommandLineOption tap("tap-themelet", "Once the lists are filled, tap a themelet that is not current and wait until it is.");
+    const QCommandLineOption create("create-themelet", "Then make a themelet of the first photo and wait until it is listed.");
     const QCommandLineOption timeout("timeout", "Give up waiting after <seconds> (default 120).", "seconds", "120");
     const QCommandLineOption size("size", "Window size, e.g. 540x960 (default 1280x800).", "WxH", "1280x800");
     const QCommandLineOption importPath("import-path", "Also look for QML modules in <dir>.", "dir");
-    parser.addOptions({ screenshot, tap, timeout, size, importPath });
+    parser.addOptions({ screenshot, tap, create, timeout, size, importPath });
     parser.process(app);
 
     const QStringList dimensions = parser.value(size).split('x');
@@ -185,10 +210,11 @@ int main(int argc, char *argv[])
     window->show();
 
     std::unique_ptr<Driver> driver;
-    if (parser.isSet(screenshot) || parser.isSet(tap)) {
+    if (parser.isSet(screenshot) || parser.isSet(tap) || parser.isSet(create)) {
         Options options;
         options.screenshot = parser.value(screenshot);
         options.tap = parser.isSet(tap);
+        options.create = parser.isSet(create);
         options.timeoutMs = parser.value(timeout).toInt() * 1000;
         driver = std::make_unique<Driver>(window, options);
     }

@@ -15,6 +15,22 @@ Item {
 
     signal created(var contentId, string name)
 
+    function choose(url, name) {
+        selectedUrl = url
+        selectedName = name
+    }
+    function createSelected() {
+        var name = selectedName
+        Themelet.create(selectedUrl, function (contentId) { pane.created(contentId, name) })
+    }
+    // Chooses a row and makes a themelet of it, as the button does; for the test mode.
+    function createFrom(index) {
+        var row = photoModel.get(index)
+        choose(String(row.url), row.fileName)
+        createSelected()
+        return row.fileName
+    }
+
     ColumnLayout {
         anchors.fill: parent
         anchors.margins: 8
@@ -77,10 +93,7 @@ Item {
                 }
                 MouseArea {
                     anchors.fill: parent
-                    onClicked: {
-                        pane.selectedUrl = String(model.url)
-                        pane.selectedName = model.fileName
-                    }
+                    onClicked: pane.choose(String(model.url), model.fileName)
                 }
             }
 
@@ -98,10 +111,7 @@ Item {
                 text: qsTr("Create themelet")
                 highlighted: true
                 enabled: pane.selectedUrl !== ""
-                onClicked: {
-                    var name = pane.selectedName
-                    Themelet.create(pane.selectedUrl, function (contentId) { pane.created(contentId, name) })
-                }
+                onClicked: pane.createSelected()
             }
         }
     }

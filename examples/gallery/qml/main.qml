@@ -34,6 +34,7 @@ ApplicationWindow {
     }
     function themeletUrl(index) { return String(themelets.get(index).url) }
     function themeletTapPoint(index) { return themeletPane.tapPoint(index) }
+    function createFromPhoto(index) { return photoPane.createFrom(index) }
 
     function activeName() {
         for (var i = 0; i < themelets.count; ++i) {
@@ -112,6 +113,7 @@ ApplicationWindow {
             themeletModel: themelets
         }
         PhotoPane {
+            id: photoPane
             x: panes.paneX(1); width: panes.paneWidth(1); height: panes.height
             visible: panes.paneVisible(1)
             photoModel: photos
