@@ -24,7 +24,7 @@ unset QT_QPA_PLATFORM QT_QUICK_BACKEND
 # gallery NAME ARGS...: runs the gallery, its output in $work/NAME.out.
 gallery() {
   local name=$1; shift
-  if ! xvfb-run -a -s "-screen 0 1280x1024x24" "$bin/themelet-gallery" --timeout 300 "$@" >"$work/$name.out" 2>&1; then
+  if ! xvfb-run -a -n $((100 + RANDOM % 800)) -s "-screen 0 1280x1024x24" "$bin/themelet-gallery" --timeout 300 "$@" >"$work/$name.out" 2>&1; then
     cat "$work/$name.out" >&2
     tail -20 "$work/themeletd.log" >&2
     fail "the gallery ($name) exited with an error"
