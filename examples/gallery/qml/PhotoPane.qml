@@ -86,8 +86,11 @@ Item {
                 Label {
                     anchors { left: parent.left; right: parent.right; bottom: parent.bottom; margins: 3 }
                     padding: 3
-                    text: model.fileName
+                    // Date and orientation come from the picture's metadata.
+                    text: model.fileName + "\n" + Qt.formatDate(model.dateTaken, "d MMM yyyy")
+                          + (model.orientation > 1 ? " · ⟳" + model.orientation : "")
                     font.pixelSize: 11
+                    lineHeight: 0.9
                     elide: Text.ElideRight
                     background: Rectangle { color: "#99000000" }
                 }
