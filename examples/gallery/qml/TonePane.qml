@@ -12,6 +12,15 @@ Item {
     property QtObject toneModel
     property QtObject profile
 
+    // Profile's first read of the volume signals its change, which would make a
+    // binding on it loop; the value is kept here instead.
+    property int ringerVolume
+    Component.onCompleted: ringerVolume = profile.ringerVolume
+    Connections {
+        target: pane.profile
+        function onRingerVolumeChanged() { pane.ringerVolume = pane.profile.ringerVolume }
+    }
+
     // Profile.profile values: Themelet 0, General 1, Silent 2.
     readonly property var profileNames: [qsTr("Themelet"), qsTr("General"), qsTr("Silent")]
     readonly property var switches: [
@@ -70,12 +79,12 @@ Item {
                         from: 0
                         to: 100
                         stepSize: 1
-                        value: pane.profile.ringerVolume
+                        value: pane.ringerVolume
                         onMoved: pane.profile.ringerVolume = value
                         Layout.fillWidth: true
                     }
                     Label {
-                        text: pane.profile.ringerVolume
+                        text: pane.ringerVolume
                         Layout.preferredWidth: 28
                     }
                 }
