@@ -22,6 +22,7 @@ struct Options
     QString screenshot;
     bool tap = false;
     bool create = false;
+    bool switchSounds = false;
     int timeoutMs = 120000;
 };
 
@@ -125,6 +126,8 @@ private:
                 return;
             listsFilled(true);
             m_stage = Settle;
+            if (m_options.switchSounds)
+                print(call("switchProfileSounds").toString());
             if (m_options.tap) {
                 const int index = call("inactiveThemelet").toInt();
                 const QPointF point = call("themeletTapPoint", index).toPointF();
@@ -186,10 +189,11 @@ int main(int argc, char *argv[])
     const QCommandLineOption screenshot("screenshot", "Wait until the three lists are filled, save a screenshot to <file>, exit.", "file");
     const QCommandLineOption tap("tap-themelet", "Once the lists are filled, tap a themelet that is not current and wait until it is.");
     const QCommandLineOption create("create-themelet", "Then make a themelet of the first photo and wait until it is listed.");
+    const QCommandLineOption switchSounds("switch-sounds", "Once the lists are filled, turn the profile's mail tone on or off and pick a ringer tone.");
     const QCommandLineOption timeout("timeout", "Give up waiting after <seconds> (default 120).", "seconds", "120");
     const QCommandLineOption size("size", "Window size, e.g. 540x960 (default 1280x800).", "WxH", "1280x800");
     const QCommandLineOption importPath("import-path", "Also look for QML modules in <dir>.", "dir");
-    parser.addOptions({ screenshot, tap, create, timeout, size, importPath });
+    parser.addOptions({ screenshot, tap, create, switchSounds, timeout, size, importPath });
     parser.process(app);
 
     const QStringList dimensions = parser.value(size).split('x');
@@ -210,11 +214,12 @@ int main(int argc, char *argv[])
     window->show();
 
     std::unique_ptr<Driver> driver;
-    if (parser.isSet(screenshot) || parser.isSet(tap) || parser.isSet(create)) {
+    if (parser.isSet(screenshot) || parser.isSet(tap) || parser.isSet(create) || parser.isSet(switchSounds)) {
         Options options;
         options.screenshot = parser.value(screenshot);
         options.tap = parser.isSet(tap);
         options.create = parser.isSet(create);
+        options.switchSounds = parser.isSet(switchSounds);
         options.timeoutMs = parser.value(timeout).toInt() * 1000;
         driver = std::make_unique<Driver>(window, options);
     }

@@ -2,7 +2,8 @@
 # The gallery against the real service and generated sample content, under
 # xvfb-run on the sandbox's private bus: the three lists fill and finish,
 # tapping a themelet makes it current (in the configuration too), a themelet
-# made from a photo shows up, and the screenshots are not blank.
+# made from a photo shows up, the profile's switches are stored, and the
+# screenshots are not blank.
 # Usage (through sandbox.sh): gallery.sh SOURCE_DIR BIN_DIR
 set -euo pipefail
 src=$1 bin=$2
@@ -41,7 +42,7 @@ not_blank() {
   [ "$colours" -gt 200 ] || fail "$1 has only $colours colours"
 }
 
-gallery wide --size 1280x800 --screenshot "$work/wide.png" --tap-themelet --create-themelet
+gallery wide --size 1280x800 --screenshot "$work/wide.png" --tap-themelet --create-themelet --switch-sounds
 for list in themeletModel photoModel toneModel; do
   grep -Eq "^$list: Finished, [1-9][0-9]* rows$" "$work/wide.out" || fail "$list did not finish with rows"
 done
@@ -52,6 +53,11 @@ tapped=$(sed -n 's/^tapped \(.*\), Themelet.source follows$/\1/p' "$work/wide.ou
 [ "$(dconf read /desktop/lunda/background/portrait/picture_filename)" = "'${tapped#file://}'" ] ||
   fail "the configuration does not name $tapped"
 grep -q '^created a themelet from ' "$work/wide.out" || fail "the new themelet did not show up"
+# The Profile object's writes reach the profile's keys.
+switched=$(sed -n 's/^switched: mail tone \(on\|off\), ringer tone \(.*\)$/\1 \2/p' "$work/wide.out")
+[ "${switched%% *}" = off ] || fail "the mail tone was not switched off: $switched"
+[ "$(dconf read /org/orbaline/themelet/profiles/general/email.alert.enabled)" = false ] || fail "email.alert.enabled is not false"
+[ "$(dconf read /org/orbaline/themelet/profiles/general/ringing.alert.tone)" = "'${switched#* }'" ] || fail "the ringer tone is not stored"
 not_blank "$work/wide.png" 1280 800
 
 # Phone size: the current themelet is still the tapped one, and marked.

@@ -35,6 +35,19 @@ ApplicationWindow {
     function themeletUrl(index) { return String(themelets.get(index).url) }
     function themeletTapPoint(index) { return themeletPane.tapPoint(index) }
     function createFromPhoto(index) { return photoPane.createFrom(index) }
+    // Flips the mail tone and makes the first ringtone that isn't the ringer tone
+    // the new one, as a user would with the switches and the list.
+    function switchProfileSounds() {
+        profile.mailToneEnabled = !profile.mailToneEnabled
+        for (var i = 0; i < tones.count; ++i) {
+            var tone = tones.get(i)
+            if (tone.filePath !== profile.ringerToneFile) {
+                profile.ringerToneFile = tone.filePath
+                break
+            }
+        }
+        return "switched: mail tone " + (profile.mailToneEnabled ? "on" : "off") + ", ringer tone " + profile.ringerToneFile
+    }
 
     function activeName() {
         for (var i = 0; i < themelets.count; ++i) {
