@@ -52,14 +52,22 @@ public:
 
 // Parameters that tell, when they go, whether their query ran: the runner
 // deletes them on a pool thread, a replaced request on the model's thread.
+QMutex s_traceMutex;
+
+// The entries of a trace that a pool thread may still be writing to.
+QStringList traced(const QStringList &trace, const QString &filter = QString())
+{
+    QMutexLocker locker(&s_traceMutex);
+    return filter.isEmpty() ? trace : trace.filter(filter);
+}
+
 class TracedParameters : public FileQueryAgent::FileParameters
 {
 public:
     TracedParameters(const QString &mimeType, QStringList *trace) : m_trace(trace) { this->mimeType = mimeType; }
     ~TracedParameters() override
     {
-        static QMutex s_mutex;
-        QMutexLocker locker(&s_mutex);
+        QMutexLocker locker(&s_traceMutex);
         *m_trace << mimeType + (QThread::currentThread() == qApp->thread() ? " dropped" : " ran");
     }
 
@@ -222,10 +230,10 @@ private slots:
         // Two requests before the update request arrives: the first is dropped unrun.
         model.query(new TracedParameters("video/*", &trace));
         model.query(new TracedParameters("audio/*", &trace));
-        QCOMPARE(trace, QStringList { "video/* dropped" });
+        QCOMPARE(traced(trace), QStringList { "video/* dropped" });
         QVERIFY(waitDone(model));
         QCOMPARE(model.count(), 300);
-        QTRY_COMPARE(trace, QStringList({ "video/* dropped", "audio/* ran" }));
+        QTRY_COMPARE(traced(trace), QStringList({ "video/* dropped", "audio/* ran" }));
         QCOMPARE(status.count(), 1);
 
         // Three while one runs: only the last runs, after the first, and the
@@ -236,7 +244,8 @@ private slots:
         model.query(new TracedParameters("text/*", &trace));
         model.query(new TracedParameters("video/*", &trace));
         model.query(new TracedParameters("*", &trace));
-        QCOMPARE(trace, QStringList({ "text/* dropped", "video/* dropped" }));
+        // The running query may already have ended on its pool thread.
+        QCOMPARE(traced(trace, " dropped"), QStringList({ "text/* dropped", "video/* dropped" }));
         bool silent = true;
         QVERIFY(QTest::qWaitFor([&]() {
             silent = silent && (status.count() == 1) == (model.status() == AbstractContentModel::Querying);
@@ -246,7 +255,7 @@ private slots:
         QCOMPARE(status.count(), 2);
         QCOMPARE(model.status(), AbstractContentModel::Finished);
         QCOMPARE(model.count(), 301);
-        QTRY_COMPARE(trace, QStringList({ "text/* dropped", "video/* dropped", "image/* ran", "* ran" }));
+        QTRY_COMPARE(traced(trace, " ran"), QStringList({ "image/* ran", "* ran" }));
     }
 
     void failedQuery()
