@@ -71,6 +71,12 @@ ProcStats procStats(pid_t pid)
                 stats.peakRssKiB = parts.at(1).toLongLong();
         }
     }
+    QFile schedstat(QStringLiteral("/proc/%1/schedstat").arg(pid));
+    if (schedstat.open(QIODevice::ReadOnly)) {
+        const QList<QByteArray> fields = schedstat.readAll().simplified().split(' ');
+        if (fields.size() > 1)
+            stats.runQueueSeconds = fields.at(1).toLongLong() / 1e9;
+    }
     stats.ok = true;
     return stats;
 }

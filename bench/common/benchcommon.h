@@ -23,6 +23,7 @@ struct ProcStats
     double cpuSeconds = 0; // user + system
     qint64 rssKiB = 0;     // VmRSS
     qint64 peakRssKiB = 0; // VmHWM
+    double runQueueSeconds = 0; // ready to run but waiting for a CPU (main thread)
     bool ok = false;
 };
 ProcStats procStats(pid_t pid);
