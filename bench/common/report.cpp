@@ -23,8 +23,12 @@ QJsonValue typed(const QString &text)
 QString cell(const QJsonObject &row, const QString &key)
 {
     const QJsonValue v = row.value(key);
-    if (v.isDouble())
-        return QString::number(v.toDouble(), 'g', 4);
+    if (v.isDouble()) {
+        const double d = v.toDouble();
+        if (d == qint64(d) && qAbs(d) < 1e12)
+            return QString::number(qint64(d));
+        return QString::number(d, 'g', 4);
+    }
     return v.toString(QStringLiteral("-"));
 }
 
