@@ -2,7 +2,6 @@
 
 #include "themeletinterface.h"
 
-#include <QColor>
 #include <QCoreApplication>
 #include <QJSEngine>
 #include <QJSValueIterator>
@@ -285,7 +284,7 @@ bool AbstractContentModel::setData(const QModelIndex &index, const QVariant &val
     Content &row = detachedRow(index.row());
     if (!row.data()->setData(role, value))
         return false;
-    saveAttributes(row, { { QString::fromUtf8(roleNames().value(role)), dbusValue(value) } });
+    saveAttributes(row, { { QString::fromUtf8(roleNames().value(role)), ThemeletInterface::dbusValue(value) } });
     const QModelIndex changed = this->index(index.row());
     emit dataChanged(changed, changed, { role });
     return true;
@@ -323,7 +322,7 @@ void AbstractContentModel::set(int index, const QJSValue &properties)
                 roles.append(role);
             }
         } else if (row.data()->setData(role, value)) {
-            changed[name] = dbusValue(value);
+            changed[name] = ThemeletInterface::dbusValue(value);
             roles.append(role);
         }
     }
@@ -370,25 +369,13 @@ int AbstractContentModel::indexOf(const QString &property, const QVariant &value
     return -1;
 }
 
-QVariant AbstractContentModel::dbusValue(const QVariant &value)
-{
-    switch (value.userType()) {
-    case QMetaType::QColor:
-        return value.value<QColor>().name(QColor::HexArgb);
-    case QMetaType::QUrl:
-        return value.toUrl().toString();
-    default:
-        return value;
-    }
-}
-
 QVariantMap AbstractContentModel::mergeMaps(QVariantMap base, const QVariantMap &overlay, bool convert)
 {
     for (auto it = overlay.cbegin(); it != overlay.cend(); ++it) {
         if (it.value().canConvert<QVariantMap>())
             base[it.key()] = mergeMaps(base.value(it.key()).toMap(), it.value().toMap(), convert);
         else
-            base[it.key()] = convert ? dbusValue(it.value()) : it.value();
+            base[it.key()] = convert ? ThemeletInterface::dbusValue(it.value()) : it.value();
     }
     return base;
 }

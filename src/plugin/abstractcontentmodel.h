@@ -54,11 +54,10 @@ public:
     Q_INVOKABLE QJSValue get(int index) const;
     Q_INVOKABLE void set(int index, const QJSValue &properties);
     Q_INVOKABLE void setProperty(int index, const QString &property, const QVariant &value);
+    using QObject::setProperty; // not hidden by the row writer above
     Q_INVOKABLE void remove(int index);
     Q_INVOKABLE int indexOf(const QString &property, const QVariant &value) const;
 
-    // What goes on the bus for a value: colours as "#AARRGGBB", URLs as text.
-    static QVariant dbusValue(const QVariant &value);
     // `overlay` laid over `base`, maps merged key by key to any depth; with
     // `convert`, the values taken from `overlay` are in their D-Bus form.
     static QVariantMap mergeMaps(QVariantMap base, const QVariantMap &overlay, bool convert = false);

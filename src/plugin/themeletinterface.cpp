@@ -1,6 +1,9 @@
 #include "themeletinterface.h"
 
+#include <QColor>
 #include <QDBusConnection>
+#include <QDBusMetaType>
+#include <QUrl>
 
 const char *const ThemeletInterface::s_serviceName = "com.vorka.themeletd";
 const char *const ThemeletInterface::s_objectPath = "/com/vorka/themeletd";
@@ -52,7 +55,7 @@ QDBusPendingReply<> ThemeletInterface::remove(int contentType, qlonglong content
 
 QDBusPendingReply<> ThemeletInterface::saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
 {
-    return asyncCallWithArgumentList(QStringLiteral("saveAttributes"), { contentType, contentId, args });
+    return asyncCallWithArgumentList(QStringLiteral("saveAttributes"), { contentType, contentId, dbusMap(args) });
 }
 
 QDBusPendingReply<qlonglong> ThemeletInterface::setThemelet(const QString &url)
@@ -63,4 +66,35 @@ QDBusPendingReply<qlonglong> ThemeletInterface::setThemelet(const QString &url)
 QDBusPendingReply<bool> ThemeletInterface::setFavorite(const QString &url, bool value)
 {
     return asyncCallWithArgumentList(QStringLiteral("setFavorite"), { url, value });
+}
+
+QVariant ThemeletInterface::dbusValue(const QVariant &value)
+{
+    switch (value.userType()) {
+    case QMetaType::QColor:
+        return value.value<QColor>().name(QColor::HexArgb);
+    case QMetaType::QUrl:
+        return value.toUrl().toString();
+    case QMetaType::QVariantMap:
+        return dbusMap(value.toMap());
+    case QMetaType::QVariantList: {
+        QVariantList list = value.toList();
+        for (QVariant &item : list)
+            item = dbusValue(item);
+        return list;
+    }
+    default:
+        if (QDBusMetaType::typeToSignature(value.userType()))
+            return value;
+        // libdbus aborts the process on a value that it can't write (an undefined
+        // one from script, an object): such a value goes as its text, or empty.
+        return value.canConvert<QString>() ? value.toString() : QString();
+    }
+}
+
+QVariantMap ThemeletInterface::dbusMap(QVariantMap map)
+{
+    for (QVariant &value : map)
+        value = dbusValue(value);
+    return map;
 }

@@ -18,12 +18,18 @@ public:
     // Null once the process has begun to exit.
     static ThemeletInterface *instance();
 
+    // What goes on the bus for a value: colours as "#AARRGGBB", URLs as text,
+    // nothing that the bus can't carry. Maps and lists are converted entry by entry.
+    static QVariant dbusValue(const QVariant &value);
+    static QVariantMap dbusMap(QVariantMap map);
+
 public slots:
     QDBusPendingReply<qlonglong> createThemelet(const QString &url);
     QDBusPendingReply<> indexFile(const QString &url);
     QDBusPendingReply<> installPackage(const QString &path);
     QDBusPendingReply<> refreshThemelets();
     QDBusPendingReply<> remove(int contentType, qlonglong contentId);
+    // Values are sent in their D-Bus form.
     QDBusPendingReply<> saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args);
     QDBusPendingReply<qlonglong> setThemelet(const QString &url);
     QDBusPendingReply<bool> setFavorite(const QString &url, bool value);

@@ -40,13 +40,14 @@ void ChangeNotifier::timerEvent(QTimerEvent *event)
     const auto window = m_windows.find(event->timerId());
     if (window == m_windows.end())
         return QObject::timerEvent(event);
-    if (window->pending) {
-        // The timer repeats: this notice opens the next window.
-        window->pending = false;
-        emit contentChanged(window->type);
-        return;
-    }
+    const int type = window->type;
+    const bool pending = window->pending;
     killTimer(event->timerId());
-    m_timerOfType.remove(window->type);
+    m_timerOfType.remove(type);
     m_windows.erase(window);
+    if (pending) {
+        // A fresh timer rather than a repeating one: a late tick would let a
+        // repeating timer catch up and send two signals less than an interval apart.
+        notify(type);
+    }
 }

@@ -74,6 +74,7 @@ private:
     ThemeletApplier m_applier;
     ThemeletSettings m_settings;
     QSqlQuery m_fileQuery;
+    QSqlQuery m_directoryQuery;
     bool m_started = false;
 };
 

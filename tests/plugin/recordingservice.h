@@ -48,15 +48,25 @@ public:
         return m_connection.send(signal);
     }
 
+    static QVariantMap plainMap(QVariantMap map)
+    {
+        for (QVariant &entry : map)
+            entry = plain(entry);
+        return map;
+    }
+
     // Nested containers arrive as QDBusArgument.
     static QVariant plain(const QVariant &value)
     {
         if (value.userType() != qMetaTypeId<QDBusArgument>())
             return value;
-        QVariantMap map = qdbus_cast<QVariantMap>(value.value<QDBusArgument>());
-        for (QVariant &entry : map)
+        const QDBusArgument argument = value.value<QDBusArgument>();
+        if (argument.currentType() == QDBusArgument::MapType)
+            return plainMap(qdbus_cast<QVariantMap>(argument));
+        QVariantList list = qdbus_cast<QVariantList>(argument);
+        for (QVariant &entry : list)
             entry = plain(entry);
-        return map;
+        return list;
     }
 
     QList<Call> calls;
@@ -77,12 +87,6 @@ public slots:
     bool setFavorite(const QString &url, bool value) { return record("setFavorite", { url, value }) != 0; }
 
 private:
-    static QVariantMap plainMap(QVariantMap map)
-    {
-        for (QVariant &entry : map)
-            entry = plain(entry);
-        return map;
-    }
 
     qlonglong record(const QString &method, const QVariantList &arguments)
     {

@@ -4,9 +4,11 @@
 #include "messagelog.h"
 #include "recordingservice.h"
 #include "testdatabase.h"
+#include "themeletqueryagent.h"
 #include "themeletinterface.h"
 
 #include <QJSEngine>
+#include <QQmlComponent>
 #include <QQmlEngine>
 #include <QThreadPool>
 #include <QtTest>
@@ -38,6 +40,13 @@ public:
     bool acceptContent(const Content &content) const override { return filter && filter(content); }
 
     std::function<bool(const Content &)> filter;
+};
+
+class ThemeletList : public ContentModel<ThemeletData>
+{
+public:
+    ThemeletList() : ContentModel<ThemeletData>(ThemeletContent::Themelet) {}
+    void requery() { query(new ThemeletQueryAgent::ThemeletParameters); }
 };
 
 // Parameters that tell, when they go, whether their query ran: the runner
@@ -107,11 +116,11 @@ class tst_ContentModel : public QObject
 
     void addFiles(const QStringList &names, const QString &mimeType = QStringLiteral("audio/ogg"))
     {
-        QStringList statements { QStringLiteral("INSERT OR IGNORE INTO directory (path, scope) VALUES ('/m', 0)") };
+        QStringList statements { QStringLiteral("BEGIN"), QStringLiteral("INSERT OR IGNORE INTO directory (path, scope) VALUES ('/m', 0)") };
         for (const QString &name : names)
             statements << QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, displayName, permissions) "
                                          "SELECT id, '%1', '%2.ogg', '%2', 3 FROM directory WHERE path = '/m'").arg(mimeType, name);
-        m_db->exec(statements);
+        m_db->exec(statements << QStringLiteral("COMMIT"));
     }
 
     // A model that has shown the files of the index.
@@ -242,7 +251,7 @@ private slots:
     void failedQuery()
     {
         // No agent for the type: an error, and the rows that the query did not deliver go.
-        FileModel model(99);
+        FileModel model(ThemeletContent::Video);
         QSignalSpy status(&model, &AbstractContentModel::statusChanged);
         model.requery();
         QVERIFY(waitDone(model));
@@ -254,16 +263,122 @@ private slots:
     {
         addFiles(numbered(2000));
         QRandomGenerator random(7);
+        int midQuery = 0;
         for (int round = 0; round < 200; ++round) {
             auto *model = new FileModel;
             model->requery();
             model->componentComplete();
             for (int i = random.bounded(4); i > 0; --i)
                 QCoreApplication::processEvents();
+            midQuery += model->status() == AbstractContentModel::Querying;
             delete model;
         }
+        QVERIFY(midQuery > 100);
         QVERIFY(QThreadPool::globalInstance()->waitForDone(30000));
         QCoreApplication::processEvents(); // nothing may be posted to the dead models
+    }
+
+    void writes()
+    {
+        RecordingService service;
+        QVERIFY(service.start());
+        addFiles({ "bell" });
+        m_db->exec({ "INSERT INTO directory (path, scope) VALUES ('/t', 0)",
+                     "INSERT INTO file (directoryId, mimeType, fileName, displayName, permissions) SELECT id, "
+                     "'application/x-vorka-themelet', 'sea.themelet', 'Sea', 3 FROM directory WHERE path = '/t'",
+                     "INSERT INTO themelet (fileId, favorite, timestamp, highlightColor) SELECT id, 0, '001', '#112233' "
+                     "FROM file WHERE fileName = 'sea.themelet'",
+                     "INSERT INTO resource SELECT t.id, 'ringerTone', f.id FROM file t, file f "
+                     "WHERE t.fileName = 'sea.themelet' AND f.fileName = 'bell.ogg'" });
+        const qlonglong id = m_db->value("SELECT id FROM file WHERE fileName = 'sea.themelet'").toLongLong();
+
+        QQmlEngine engine;
+        QQmlComponent quick(&engine); // brings the colour type of Qt.rgba
+        quick.setData("import QtQuick 2.0; QtObject {}", QUrl());
+        std::unique_ptr<QObject> quickObject(quick.create());
+        ThemeletList model;
+        QQmlEngine::setContextForObject(&model, engine.rootContext());
+        model.requery();
+        QVERIFY(waitDone(model));
+        QCOMPARE(model.count(), 1);
+        QCOMPARE(model.get(0).property("displayName").toString(), "Sea");
+        QVERIFY(model.get(1).isUndefined());
+        QCOMPARE(model.indexOf("displayName", "Sea"), 0);
+        QCOMPARE(model.indexOf("displayName", "Land"), -1);
+        QCOMPARE(model.indexOf("nope", "Sea"), -1);
+
+        // Calls cross the bus in order: a last known one tells that nothing else came.
+        const auto callsUpTo = [&service](const QString &fence) {
+            ThemeletInterface::instance()->indexFile(fence);
+            if (!QTest::qWaitFor([&]() { return !service.calls.isEmpty() && service.calls.last().method == "indexFile"; }))
+                return QList<RecordingService::Call>();
+            QList<RecordingService::Call> calls = service.calls;
+            calls.removeLast();
+            service.calls.clear();
+            return calls;
+        };
+
+        QSignalSpy changed(&model, &QAbstractItemModel::dataChanged);
+        const Content held(static_cast<ContentData *>(model.index(0, 0).internalPointer()));
+        model.setProperty(0, "highlightColor", QColor(255, 0, 0, 128));
+        QCOMPARE(model.index(0, 0).data(ThemeletData::HighlightColorRole).value<QColor>(), QColor(255, 0, 0, 128));
+        QCOMPARE(held.data()->data(ThemeletData::HighlightColorRole).value<QColor>(), QColor("#112233")); // cloned, not shared
+        QCOMPARE(changed.count(), 1);
+        QCOMPARE(changed.at(0).at(2).value<QVector<int>>(), QVector<int> { ThemeletData::HighlightColorRole });
+        auto calls = callsUpTo("1");
+        QCOMPARE(calls.size(), 1);
+        QCOMPARE(calls.at(0).method, "saveAttributes");
+        QCOMPARE(calls.at(0).arguments, QVariantList({ 1, id, QVariantMap { { "highlightColor", "#80ff0000" } } }));
+
+        // Unknown names, roles that can't be written, rows that don't exist: nothing goes out.
+        model.setProperty(0, "nope", 1);
+        model.setProperty(0, "wallpaperUrl", "file:///w.jpg");
+        model.setProperty(5, "displayName", "x");
+        model.set(0, engine.evaluate("({ nope: 1, zefId: 'z' })"));
+        model.set(1, engine.evaluate("({ displayName: 'x' })"));
+        model.remove(-1);
+        model.remove(1);
+        QCOMPARE(callsUpTo("2").size(), 0);
+        QCOMPARE(changed.count(), 1);
+
+        // One set is one call and one signal; a nested map sends only the keys given.
+        model.set(0, engine.evaluate("({ displayName: 'Bay', nope: 2, secondaryColor: Qt.rgba(0, 0, 1, 1),"
+                                     "  resources: { ringerTone: { displayName: 'Bell 2' }, messageTone: { url: 'file:///m.ogg' } } })"));
+        QCOMPARE(changed.count(), 2);
+        QCOMPARE(changed.at(1).at(2).value<QVector<int>>(),
+                 QVector<int>({ ThemeletData::DisplayNameRole, ThemeletData::SecondaryColorRole, ThemeletData::ResourcesRole }));
+        calls = callsUpTo("3");
+        QCOMPARE(calls.size(), 1);
+        QCOMPARE(calls.at(0).arguments.at(2).toMap(),
+                 QVariantMap({ { "displayName", "Bay" }, { "secondaryColor", "#ff0000ff" },
+                               { "resources", QVariantMap { { "ringerTone", QVariantMap { { "displayName", "Bell 2" } } },
+                                                            { "messageTone", QVariantMap { { "url", "file:///m.ogg" } } } } } }));
+        const QVariantMap resources = model.index(0, 0).data(ThemeletData::ResourcesRole).toMap();
+        QCOMPARE(resources.value("ringerTone").toMap(),
+                 QVariantMap({ { "url", QUrl::fromLocalFile("/m/bell.ogg") }, { "fileName", "bell.ogg" }, { "displayName", "Bell 2" } }));
+        QCOMPARE(resources.value("messageTone").toMap(), QVariantMap({ { "url", "file:///m.ogg" } }));
+
+        // What the bus can't carry as it is: undefined, an object, a URL deep in a map.
+        model.set(0, engine.evaluate("({ displayName: undefined, resources: { ringerTone: { fileName: [undefined, 1] } } })"));
+        model.setProperty(0, "ringerVolume", QVariant::fromValue<QObject *>(&model));
+        model.setProperty(0, "resources", QVariantMap { { "a", QVariantList { QVariantMap { { "url", QUrl("file:///a") } } } } });
+        calls = callsUpTo("5");
+        QCOMPARE(calls.size(), 3);
+        QCOMPARE(calls.at(0).arguments.at(2).toMap(),
+                 QVariantMap({ { "displayName", "" }, { "resources", QVariantMap { { "ringerTone", QVariantMap { { "fileName", QVariantList { "", 1 } } } } } } }));
+        QCOMPARE(calls.at(1).arguments.at(2).toMap(), QVariantMap({ { "ringerVolume", "" } }));
+        QCOMPARE(calls.at(2).arguments.at(2).toMap(),
+                 QVariantMap({ { "resources", QVariantMap { { "a", QVariantList { QVariantMap { { "url", "file:///a" } } } } } } }));
+
+        // Removal is the service's: the row stays until a new query.
+        QSignalSpy count(&model, &AbstractContentModel::countChanged);
+        model.remove(0);
+        calls = callsUpTo("4");
+        QCOMPARE(calls.size(), 1);
+        QCOMPARE(calls.at(0).method, "remove");
+        QCOMPARE(calls.at(0).arguments, QVariantList({ 1, id }));
+        QCOMPARE(model.count(), 1);
+        QCOMPARE(count.count(), 0);
     }
 
     void filter()
@@ -301,5 +416,5 @@ private slots:
     }
 };
 
-QTEST_GUILESS_MAIN(tst_ContentModel)
+QTEST_MAIN(tst_ContentModel)
 #include "tst_contentmodel.moc"

@@ -335,6 +335,7 @@ private slots:
         QTest::newRow("web url") << "setThemelet" << QVariantList { "https://example.com/a.themelet" } << invalid;
         QTest::newRow("no themelet there") << "setThemelet" << QVariantList { "file:///nonexistent/a.themelet" } << notFound;
         QTest::newRow("relative package") << "installPackage" << QVariantList { "extra" } << invalid;
+        QTest::newRow("watched directory as package") << "installPackage" << QVariantList { "%watched" } << invalid;
         QTest::newRow("missing package") << "installPackage" << QVariantList { "/nonexistent" } << notFound;
         QTest::newRow("missing picture") << "createThemelet" << QVariantList { "file:///nonexistent.jpg" } << notFound;
         QTest::newRow("no picture") << "createThemelet" << QVariantList { "file://%package/sunset.themelet" } << invalid;

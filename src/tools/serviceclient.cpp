@@ -1,0 +1,77 @@
+#include "serviceclient.h"
+
+#include "themeletinterface.h"
+
+#include <QDBusConnectionInterface>
+#include <QDBusError>
+#include <QDBusReply>
+
+namespace {
+const int MaxMessageLength = 300;
+
+// Text from the bus reaches a terminal: no control characters, no new lines.
+QString oneLine(const QString &text)
+{
+    QString line = text.left(MaxMessageLength);
+    for (QChar &c : line) {
+        if (c.category() == QChar::Other_Control)
+            c = QLatin1Char(' ');
+    }
+    return line.trimmed();
+}
+}
+
+QString ServiceClient::serviceName()
+{
+    return QLatin1String(ThemeletInterface::s_serviceName);
+}
+
+ThemeletInterface *ServiceClient::proxy() const
+{
+    return ThemeletInterface::instance();
+}
+
+QDBusConnection ServiceClient::connection() const
+{
+    return proxy()->connection();
+}
+
+bool ServiceClient::isRunning()
+{
+    const QDBusConnection bus = connection();
+    if (!bus.isConnected()) {
+        m_error = QStringLiteral("no D-Bus session bus: ") + bus.lastError().message();
+        return false;
+    }
+    const QDBusReply<bool> registered = bus.interface()->isServiceRegistered(serviceName());
+    if (!registered.isValid()) {
+        m_error = QStringLiteral("cannot ask the session bus about themeletd: ")
+                + oneLine(registered.error().message());
+        return false;
+    }
+    if (!registered.value()) {
+        m_error = QStringLiteral("themeletd is not running (nobody owns ") + serviceName()
+                + QStringLiteral(" on the session bus)");
+        return false;
+    }
+    return true;
+}
+
+uint ServiceClient::pid()
+{
+    const QDBusConnection bus = connection();
+    if (!bus.isConnected())
+        return 0;
+    const QDBusReply<uint> reply = bus.interface()->servicePid(serviceName());
+    return reply.isValid() ? reply.value() : 0;
+}
+
+bool ServiceClient::wait(QDBusPendingCall call)
+{
+    call.waitForFinished();
+    if (!call.isError())
+        return true;
+    const QDBusError error = call.error();
+    m_error = oneLine(error.message().isEmpty() ? error.name() : error.message());
+    return false;
+}
