@@ -69,6 +69,16 @@ ProcStats procStats(pid_t pid)
                 stats.rssKiB = parts.at(1).toLongLong();
             else if (parts.at(0) == "VmHWM:")
                 stats.peakRssKiB = parts.at(1).toLongLong();
+            else if (parts.at(0) == "RssAnon:")
+                stats.anonKiB = parts.at(1).toLongLong();
+        }
+    }
+    QFile rollup(QStringLiteral("/proc/%1/smaps_rollup").arg(pid));
+    if (rollup.open(QIODevice::ReadOnly)) {
+        for (const QByteArray &l : rollup.readAll().split('\n')) {
+            const QList<QByteArray> parts = l.simplified().split(' ');
+            if (parts.size() >= 2 && parts.at(0) == "Pss:")
+                stats.pssKiB = parts.at(1).toLongLong();
         }
     }
     QFile schedstat(QStringLiteral("/proc/%1/schedstat").arg(pid));

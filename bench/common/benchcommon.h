@@ -24,6 +24,8 @@ struct ProcStats
     qint64 rssKiB = 0;     // VmRSS
     qint64 peakRssKiB = 0; // VmHWM
     double runQueueSeconds = 0; // ready to run but waiting for a CPU (main thread)
+    qint64 anonKiB = 0;    // RssAnon: what the process itself allocated
+    qint64 pssKiB = 0;     // shared library pages divided among their users
     bool ok = false;
 };
 ProcStats procStats(pid_t pid);

@@ -115,6 +115,8 @@ int main(int argc, char **argv)
             { QStringLiteral("target"), QStringLiteral("<=25_MiB_peak") },
             { QStringLiteral("result"), done && peakMiB <= 25 ? QStringLiteral("pass") : QStringLiteral("fail") },
             { QStringLiteral("rss_end_mib"), qMax(last.rssKiB, settled.rssKiB) / 1024.0 },
+            { QStringLiteral("anon_end_mib"), settled.anonKiB / 1024.0 },
+            { QStringLiteral("pss_end_mib"), settled.pssKiB / 1024.0 },
             { QStringLiteral("files"), rows },
     });
     Bench::result(QStringLiteral("P6growth"), {
