@@ -46,6 +46,13 @@ double now()
     return ts.tv_sec + ts.tv_nsec / 1e9;
 }
 
+double cpuNow()
+{
+    timespec ts;
+    clock_gettime(CLOCK_PROCESS_CPUTIME_ID, &ts);
+    return ts.tv_sec + ts.tv_nsec / 1e9;
+}
+
 ProcStats procStats(pid_t pid)
 {
     ProcStats stats;

@@ -17,6 +17,8 @@ void note(const QString &text);
 
 // Monotonic seconds since an arbitrary origin, comparable across processes.
 double now();
+// CPU seconds (user+sys) of this process so far: steadier than wall time on a busy machine.
+double cpuNow();
 
 struct ProcStats
 {

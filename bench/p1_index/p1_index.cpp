@@ -98,6 +98,7 @@ int main(int argc, char **argv)
             { QStringLiteral("result"), done && ratio <= 2 ? QStringLiteral("pass") : QStringLiteral("fail") },
             { QStringLiteral("files"), rows },
             { QStringLiteral("cpu_s"), last.cpuSeconds },
+            { QStringLiteral("cpu_ratio"), last.cpuSeconds / qMax(0.001, (floor1.value(QStringLiteral("cpu")).toDouble() + floor2.value(QStringLiteral("cpu")).toDouble()) / 2) },
             { QStringLiteral("runqueue_wait_s"), last.runQueueSeconds },
             { QStringLiteral("floor_cpu_s"), floor1.value(QStringLiteral("cpu")) },
             { QStringLiteral("floor_runs_s"), QStringLiteral("%1/%2").arg(floor1.value(QStringLiteral("s")).toDouble(), 0, 'f', 3)
