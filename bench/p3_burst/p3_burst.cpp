@@ -55,9 +55,10 @@ int main(int argc, char **argv)
     if (!QDir().mkpath(dir) || !picture.open(QIODevice::ReadOnly))
         return 1;
     const QByteArray bytes = picture.readAll();
+    const QString suffix = QFileInfo(picture.fileName()).suffix(); // the copies keep the type of the original
     QVector<QByteArray> paths;
     for (int i = 0; i < files; ++i)
-        paths.append(QFile::encodeName(QStringLiteral("%1/burst_%2.jpg").arg(dir).arg(i, 6, 10, QLatin1Char('0'))));
+        paths.append(QFile::encodeName(QStringLiteral("%1/burst_%2.%3").arg(dir).arg(i, 6, 10, QLatin1Char('0')).arg(suffix)));
 
     Bench::Child daemon;
     if (!daemon.start(args.at(dash + 1), args.mid(dash + 2)))
