@@ -14,6 +14,8 @@ export XDG_DATA_DIRS="${XDG_DATA_DIRS:-/usr/local/share:/usr/share}"
 export THEMELET_SYSROOT="$SANDBOX/sysroot"
 export THEMELET_SANDBOX="$SANDBOX"
 export LANG=C.UTF-8 LC_ALL=C.UTF-8
+# Not UTC, and with clock changes: times must not depend on the zone.
+export TZ=Europe/Helsinki
 export QT_QPA_PLATFORM=offscreen QT_QUICK_BACKEND=software
 unset DBUS_SESSION_BUS_ADDRESS DISPLAY QT_NO_GLIB
 dbus-run-session -- "$@" </dev/null

@@ -174,7 +174,9 @@ void AbstractContentModel::update()
             m_contentReceived = false;
             // Not emptied: it grows over the query, and m_content's cursors say how far it was merged.
             const QVector<Content> received = m_receivedContent;
+            beginEdit();
             m_content.merge(received, agent);
+            endEdit();
             if (filtered)
                 refilter();
             continue;
@@ -200,6 +202,7 @@ void AbstractContentModel::update()
             m_queryRequested = true;
         }
 
+        beginEdit();
         if (m_pendingStatus != Null) {
             m_content.finish(received, agent);
         } else {
@@ -207,6 +210,7 @@ void AbstractContentModel::update()
                 agent->removeRange(0, m_content.size());
             m_content.resetCursors();
         }
+        endEdit();
         if (filtered)
             refilter();
         if (m_status != Querying)
@@ -409,8 +413,33 @@ void AbstractContentModel::updateRange(int index, int count, const QVector<Conte
     emit dataChanged(this->index(index), this->index(index + count - 1));
 }
 
+void AbstractContentModel::beginEdit()
+{
+    ++m_editDepth;
+}
+
+void AbstractContentModel::endEdit()
+{
+    if (--m_editDepth > 0)
+        return;
+    while (m_deferredFilter >= 0 || m_deferredRefilter) {
+        if (m_deferredFilter >= 0) {
+            const bool filtered = m_deferredFilter;
+            m_deferredFilter = -1;
+            setFiltered(filtered);
+        } else {
+            m_deferredRefilter = false;
+            refilter();
+        }
+    }
+}
+
 void AbstractContentModel::refilter()
 {
+    if (m_editDepth > 0) {
+        m_deferredRefilter = true;
+        return;
+    }
     if (m_currentContent != &m_filteredContent)
         return;
     QVector<Content> accepted;
@@ -419,16 +448,22 @@ void AbstractContentModel::refilter()
         if (acceptContent(row))
             accepted.append(row);
     }
+    beginEdit();
     m_synchronizing = true;
     int index = 0;
     int sourceIndex = 0;
     SynchronizedContent::walk(m_filteredContent, accepted, index, sourceIndex, this);
     SynchronizedContent::finish(m_filteredContent, accepted, index, sourceIndex, this);
     m_synchronizing = false;
+    endEdit();
 }
 
 void AbstractContentModel::setFiltered(bool filtered)
 {
+    if (m_editDepth > 0) {
+        m_deferredFilter = filtered;
+        return;
+    }
     if (filtered) {
         if (m_currentContent == &m_filteredContent)
             return;
@@ -443,6 +478,7 @@ void AbstractContentModel::setFiltered(bool filtered)
         return;
     // A pure difference: the rows left on show read m_content's newer data once
     // the pointer moves, without a dataChanged.
+    beginEdit();
     m_synchronizing = true;
     int index = 0;
     int sourceIndex = 0;
@@ -450,4 +486,5 @@ void AbstractContentModel::setFiltered(bool filtered)
     SynchronizedContent::finish(m_filteredContent, m_content, index, sourceIndex, this);
     m_synchronizing = false;
     m_currentContent = &m_content;
+    endEdit();
 }

@@ -84,6 +84,8 @@ private:
     // The row on show, private to this list and its record to this row.
     Content &detachedRow(int index);
     void saveAttributes(const Content &row, const QVariantMap &attributes);
+    void beginEdit();
+    void endEdit();
 
     SynchronizedContent m_content;
     SynchronizedContent m_filteredContent;
@@ -99,6 +101,11 @@ private:
     bool m_queryRequested = false;
     bool m_contentReceived = false;
     bool m_synchronizing = false;
+    // Row signals run script handlers; a filter change made from one of them
+    // waits until the walk that emitted the signal has ended.
+    int m_editDepth = 0;
+    int m_deferredFilter = -1;
+    bool m_deferredRefilter = false;
 
     static QMutex s_queryMutex;
 };

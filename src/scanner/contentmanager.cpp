@@ -8,6 +8,8 @@
 #include "installmanager.h"
 #include "themeletmanager.h"
 
+#include <QFileInfo>
+
 ContentManager::ContentManager() = default;
 
 ContentManager::~ContentManager() = default;
@@ -30,6 +32,11 @@ bool ContentManager::save(qint64, const QMap<QString, QVariant> &)
 bool ContentManager::remove(qint64)
 {
     return false;
+}
+
+QDateTime ContentManager::modificationTime(const QFileInfo &info)
+{
+    return info.lastModified().toUTC();
 }
 
 ContentManager *ContentManager::managerFromType(int type)

@@ -1,10 +1,13 @@
 #ifndef CONTENTMANAGER_H
 #define CONTENTMANAGER_H
 
+#include <QDateTime>
 #include <QList>
 #include <QMap>
 #include <QString>
 #include <QVariant>
+
+class QFileInfo;
 
 // Base of the writing side: one manager per content type, owned by DbManager.
 class ContentManager
@@ -23,6 +26,10 @@ public:
     static QList<ContentManager *> scannerManagers();
 
 protected:
+    // A file's time as an instant: stored so, it reads back equal under any
+    // time zone, also in the repeated hour of a clock change.
+    static QDateTime modificationTime(const QFileInfo &info);
+
     // One step of a driver's list: the head runs until it reports no more,
     // then it is dropped. False once the list is empty.
     static bool updateFirst(QList<ContentManager *> &managers);

@@ -359,12 +359,16 @@ bool FileManager::readEvent()
         QString name;
         if (header.len > 0) {
             const QByteArray bytes(nameBytes, int(strnlen(nameBytes, nameSize)));
-            name = QString::fromUtf8(bytes);
+            // Decoded as part of the whole path, as a scan's listing does: a name
+            // alone would lose a leading U+FEFF as a byte order mark.
+            const QByteArray pathBytes = QFile::encodeName(directory.path) + bytes;
+            const QString decoded = QFile::decodeName(pathBytes);
             // A scan never lists such names, and the decoded path wouldn't lead back to the file.
-            if (name.toUtf8() != bytes) {
+            if (QFile::encodeName(decoded) != pathBytes || !decoded.startsWith(directory.path)) {
                 qWarning() << "Skipping a file name that is not valid UTF-8" << directory.path << bytes;
                 continue;
             }
+            name = decoded.mid(directory.path.size());
         }
         const QString path = directory.path + name;
 
@@ -386,7 +390,7 @@ bool FileManager::readEvent()
             m_fileIdQuery.bindValue(1, name);
             if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
                 m_fileIdQuery.finish();
-                updateTimes << info.lastModified();
+                updateTimes << modificationTime(info);
                 updateDirectories << directory.id;
                 updateNames << name;
             } else {
@@ -394,13 +398,13 @@ bool FileManager::readEvent()
                 insertDirectories << directory.id;
                 insertTypes << m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name();
                 insertNames << name;
-                insertTimes << info.lastModified();
+                insertTimes << modificationTime(info);
             }
         } else if (header.mask & LeftMask) {
             deleteDirectories << directory.id;
             deleteNames << name;
         } else if (header.mask & IN_MODIFY) {
-            updateTimes << QFileInfo(path).lastModified();
+            updateTimes << modificationTime(QFileInfo(path));
             updateDirectories << directory.id;
             updateNames << name;
         }
@@ -440,7 +444,7 @@ bool FileManager::scanDirectory()
     const QString path = m_pendingDirectories.takeFirst();
     qint64 id = 0;
     DirectoryScope scope = UserScope;
-    if (!watchDirectory(path, &id, &scope))
+    if (isLinkedDirectory(path) || !watchDirectory(path, &id, &scope))
         return !m_pendingDirectories.isEmpty();
 
     QVector<DiskEntry> files;
@@ -452,7 +456,7 @@ bool FileManager::scanDirectory()
         if (!info.isDir()) {
             // Also a link to a file: its own name, its target's time.
             const QString fileName = info.fileName();
-            files.append({ fileName.toUtf8(), entryPath, fileName, info.lastModified() });
+            files.append({ fileName.toUtf8(), entryPath, fileName, modificationTime(info) });
         } else if (!info.isSymLink()) {
             directories.append({ info.fileName().toUtf8(), entryPath, QString(), QDateTime() });
         }
@@ -615,13 +619,21 @@ qint64 FileManager::insertFile(const QString &path)
         m_fileInsert.bindValue(0, directoryId);
         m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
         m_fileInsert.bindValue(2, info.fileName());
-        m_fileInsert.bindValue(3, info.lastModified());
+        m_fileInsert.bindValue(3, modificationTime(info));
     });
     if (id == 0)
         return 0;
 
     commit();
     return id;
+}
+
+bool FileManager::isLinkedDirectory(const QString &path)
+{
+    if (!QFileInfo(path).isSymLink())
+        return false;
+    qWarning() << "Skipping a directory that is a symbolic link" << path;
+    return true;
 }
 
 FileManager *FileManager::instance()

@@ -58,6 +58,10 @@ public:
     // first base, so the pointer has to be converted.
     static FileManager *instance();
 
+    // True, with a warning, for a directory that is now a symbolic link: links
+    // to directories are never followed, also when swapped in after queueing.
+    static bool isLinkedDirectory(const QString &path);
+
     // True while an update event is on its way or a pass is running.
     bool isUpdateQueued() const { return m_updateQueued; }
 

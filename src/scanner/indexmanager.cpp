@@ -2,12 +2,12 @@
 
 #include "content.h"
 #include "filemanager.h"
+#include "packagefile.h"
 #include "queryagentdatabase.h"
 #include "themelettranslator.h"
 
 #include <QDateTime>
 #include <QDebug>
-#include <QFile>
 #include <QFileInfo>
 #include <QJsonArray>
 #include <QJsonDocument>
@@ -114,15 +114,14 @@ bool IndexManager::updateMetaData()
     }
     m_modifiedReset.finish();
 
-    // Only regular files: opening a FIFO would block the whole loop.
-    QFile file(indexPath);
-    if (!QFileInfo(indexPath).isFile() || !file.open(QIODevice::ReadOnly))
+    QByteArray content;
+    if (!PackageFile::read(indexPath, &content))
         return true;
 
     QJsonParseError error;
-    const QJsonDocument document = QJsonDocument::fromJson(file.readAll(), &error);
+    const QJsonDocument document = QJsonDocument::fromJson(content, &error);
     if (document.isNull() || !document.isObject()) {
-        qWarning() << "Error parsing index from file" << file.fileName() << ", offset:" << error.offset
+        qWarning() << "Error parsing index from file" << indexPath << ", offset:" << error.offset
                    << ", errorString:" << error.errorString();
         return true;
     }
@@ -130,7 +129,7 @@ bool IndexManager::updateMetaData()
 
     FileManager *files = FileManager::instance();
     const QString directory = indexPath.left(indexPath.size() - 6);
-    const qint64 directoryId = files
+    const qint64 directoryId = files && !FileManager::isLinkedDirectory(directory)
             ? files->appendDirectory(directory, FileManager::IndexScope, FileManager::NoScan)
             : 0;
     if (directoryId == 0)
@@ -146,7 +145,7 @@ bool IndexManager::updateMetaData()
 
     // A null suffix: Qt's default, so the locale's catalogues end in ".qm".
     ThemeletTranslator translator{QString()};
-    translator.selectCatalog(root.value(QStringLiteral("translationCatalog")).toString());
+    translator.selectCatalog(PackageFile::text(root.value(QStringLiteral("translationCatalog"))));
 
     QVector<Entry> entries;
     QVector<QPair<QString, QString>> aliases;
@@ -155,25 +154,23 @@ bool IndexManager::updateMetaData()
         const QJsonObject object = value.toObject();
         if (object.isEmpty())
             continue;
-        const QString fileName = object.value(QStringLiteral("fileName")).toString();
-        if (fileName.isEmpty() || fileName.contains(QLatin1Char('/')))
+        const QString fileName = PackageFile::text(object.value(QStringLiteral("fileName")));
+        const QString path = PackageFile::regularFile(directory, fileName);
+        if (path.isEmpty())
             continue;
-        const QString path = directory + QLatin1Char('/') + fileName;
         const QFileInfo info(path);
-        if (!info.exists())
-            continue;
 
         Entry entry;
         entry.name = fileName.toUtf8();
         entry.path = path;
         entry.fileName = fileName;
-        entry.displayName = translator.translate(object.value(QStringLiteral("displayName")).toString());
-        entry.category = object.value(QStringLiteral("category")).toString();
-        entry.modificationTime = info.lastModified();
+        entry.displayName = translator.translate(PackageFile::text(object.value(QStringLiteral("displayName"))));
+        entry.category = PackageFile::text(object.value(QStringLiteral("category")));
+        entry.modificationTime = modificationTime(info);
 
         const QJsonArray aliasArray = object.value(QStringLiteral("aliases")).toArray();
         for (const QJsonValue &alias : aliasArray) {
-            const QString oldName = alias.toString();
+            const QString oldName = PackageFile::text(alias);
             if (!oldName.isEmpty())
                 aliases.append(qMakePair(oldName, fileName));
         }

@@ -288,7 +288,7 @@ bool InstallManager::install(const QString &path, const QString &zefId, bool for
         } else {
             continue;
         }
-        entries.append({ fileName.toUtf8(), filePath, fileName, mimeType, info.lastModified() });
+        entries.append({ fileName.toUtf8(), filePath, fileName, mimeType, modificationTime(info) });
     }
     std::sort(entries.begin(), entries.end(), [](const FileEntry &a, const FileEntry &b) {
         return qstrcmp(a.key, b.key) < 0;

@@ -1,17 +1,14 @@
 #include "themeletfile.h"
 
+#include "packagefile.h"
+
 #include <QDateTime>
 #include <QDebug>
-#include <QFile>
-#include <QFileInfo>
 #include <QJsonDocument>
 #include <QJsonObject>
 #include <QJsonParseError>
 
 namespace {
-
-// A themelet is a few hundred bytes; anything past this is cut off and fails to parse.
-constexpr qint64 s_maximumSize = 4 * 1024 * 1024;
 
 QString normalisedTimestamp(const QJsonValue &value, const QString &fallback)
 {
@@ -25,13 +22,13 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
                                         const QString &batchTime)
 {
     const QString path = directory + QLatin1Char('/') + fileName;
-    // Only regular files: opening a FIFO would block the service.
-    QFile file(path);
-    if (!QFileInfo(path).isFile() || !file.open(QIODevice::ReadOnly))
+    // Too large is unreadable, not malformed: the row and the user's edits stay.
+    QByteArray content;
+    if (!PackageFile::read(path, &content))
         return Unreadable;
 
     QJsonParseError error { 0, QJsonParseError::NoError };
-    const QJsonDocument document = QJsonDocument::fromJson(file.read(s_maximumSize), &error);
+    const QJsonDocument document = QJsonDocument::fromJson(content, &error);
     if (document.isNull() || !document.isObject()) {
         qWarning() << "Failed to parse themelet file" << path << ", jsonError:" << int(error.error)
                    << ", jsonOffset:" << error.offset;
@@ -39,24 +36,23 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
     }
     const QJsonObject object = document.object();
 
-    const QString wallpaper = object.value(QLatin1String("wallpaper")).toString();
-    if (wallpaper.isEmpty() || wallpaper.contains(QLatin1Char('/')))
-        return Invalid;
+    // Removing the themelet deletes its wallpaper: it has to be a file of the package.
     this->directory = directory;
-    wallpaperPath = directory + QLatin1String("/images/") + wallpaper;
-    if (!QFile::exists(wallpaperPath))
+    wallpaperPath = PackageFile::fileInside(directory, QStringLiteral("images"),
+                                            PackageFile::text(object.value(QLatin1String("wallpaper"))));
+    if (wallpaperPath.isEmpty())
         return Invalid;
 
-    translationCatalog = object.value(QLatin1String("translationCatalog")).toString();
+    translationCatalog = PackageFile::text(object.value(QLatin1String("translationCatalog")));
     favorite = object.value(QLatin1String("favorite")).toBool(true);
-    displayName = object.value(QLatin1String("displayName")).toString();
+    displayName = PackageFile::text(object.value(QLatin1String("displayName")));
     highlightColor = object.value(QLatin1String("highlightColor")).toVariant();
     secondaryHighlightColor = object.value(QLatin1String("secondaryHighlightColor")).toVariant();
     primaryColor = object.value(QLatin1String("primaryColor")).toVariant();
     // Plural in the file, singular everywhere else.
     secondaryColor = object.value(QLatin1String("secondaryColors")).toVariant();
     ringerVolume = object.value(QLatin1String("ringerVolume")).toInt(80);
-    partnerSpace = object.value(QLatin1String("partnerSpace")).toString();
+    partnerSpace = PackageFile::text(object.value(QLatin1String("partnerSpace")));
     timestamp = normalisedTimestamp(object.value(QLatin1String("timestamp")), batchTime);
     // A "version" that is there but no whole number is 0, a missing one 1.
     version = object.contains(QLatin1String("version"))
@@ -69,7 +65,7 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
         if (tone.isEmpty())
             continue;
         tones[i].present = true;
-        tones[i].file = tone.value(QLatin1String("file")).toString();
+        tones[i].file = PackageFile::text(tone.value(QLatin1String("file")));
         // Only a number counts: "enabled": false leaves the tone on.
         tones[i].enabled = tone.value(QLatin1String("enabled")).toInt(1);
     }
@@ -92,9 +88,9 @@ QString ThemeletFile::tonePath(int tone, const QString &fallback) const
     if (!entry.present)
         return QString();
     if (!entry.file.isEmpty()) {
-        // A path in "file" is refused outright, without falling back.
-        return entry.file.contains(QLatin1Char('/'))
-                ? QString() : directory + QLatin1String("/sounds/") + entry.file;
+        // A path in "file", or a name that isn't a file of the package, is
+        // refused outright, without falling back.
+        return PackageFile::fileInside(directory, QStringLiteral("sounds"), entry.file);
     }
     return entry.enabled != 0 ? fallback : QString();
 }

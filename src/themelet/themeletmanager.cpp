@@ -429,6 +429,13 @@ qint64 ThemeletManager::create(const Themelet &themelet)
         directoryId = files ? files->appendDirectory(path.left(slash), FileManager::UserScope,
                                                      FileManager::ScanNew)
                             : 0;
+        // An empty or non-local url has no directory; the row would vanish from every list.
+        if (directoryId.toLongLong() == 0) {
+            m_queryThemelet.finish();
+            qWarning("%s", s_createFunction);
+            qWarning() << "No local directory for themelet" << id << "at" << themelet->url;
+            return 0;
+        }
     }
     renameFile.bindValue(0, directoryId);
     renameFile.bindValue(1, fileName);

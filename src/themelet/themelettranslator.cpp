@@ -21,7 +21,8 @@ void ThemeletTranslator::selectCatalog(const QString &catalog)
     if (catalog == m_catalog)
         return;
     m_loaded = false;
-    if (catalog.isEmpty())
+    // A stem names a catalogue of the translations directory, never a path.
+    if (catalog.isEmpty() || catalog.contains(QLatin1Char('/')))
         return;
 
     m_catalog = catalog;

@@ -14,6 +14,8 @@
 
 #include <sys/ioctl.h>
 
+#include <ctime>
+
 // Files on disk for the managers of the index, and the real event loop run until they are idle.
 namespace Fixture {
 
@@ -87,6 +89,13 @@ inline bool waitIdle()
     }
     QCoreApplication::instance()->removeEventFilter(&counter);
     return quietRounds >= 2;
+}
+
+// As after a journey: local time changes, file times don't.
+inline void setTimeZone(const QByteArray &zone)
+{
+    qputenv("TZ", zone);
+    tzset();
 }
 
 inline InstallManager *installer() { return static_cast<InstallManager *>(ContentManager::managerFromType(6)); }

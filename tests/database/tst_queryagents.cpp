@@ -1,5 +1,6 @@
 #include "dbmanager.h"
 #include "filequeryagent.h"
+#include "photoqueryagent.h"
 #include "messagelog.h"
 #include "testdatabase.h"
 #include "themeletqueryagent.h"
@@ -260,6 +261,41 @@ private slots:
         for (const Content &missing : { files.queryByUrl(QUrl("http://example.com/other.ogg")), files.queryByUrl(QUrl::fromLocalFile("/d/x.ogg")),
                                         themelets.queryByUrl(url), themelets.queryByUrl(QUrl("http://example.com/t.ogg")) })
             QVERIFY(!missing.isValid());
+
+        // The thread's table name already taken: false, and no batch at all.
+        const QString table = "themelet_" + QString::number(m_database->threadId());
+        QVERIFY(QSqlQuery(*m_database).exec("CREATE TEMPORARY TABLE " + table + " (x)"));
+        MessageLog log(false);
+        Batches none;
+        QVERIFY(!themelets.query(&none, ThemeletQueryAgent::ThemeletParameters()) && none.sizes.isEmpty());
+        QCOMPARE(log.warnings().mid(0, 2), (QStringList { "virtual bool ThemeletQueryAgent::query(QueryAgent::Recipient*, "
+                                                          "const QueryAgent::Parameters&)", "Failed to create themelet table" }));
+        QVERIFY(QSqlQuery(*m_database).exec("DROP TABLE " + table));
+    }
+
+    void photos()
+    {
+        PhotoQueryAgent photos(*m_database);
+        Batches empty;
+        QVERIFY(photos.query(&empty, QueryAgent::Parameters()) && empty.sizes == QList<int> { 0 });
+
+        // By date taken; a file without an image row is no photo.
+        const qint64 late = addFile("/p/late.jpg", "image/jpeg"), early = addFile("/p/early.jpg", "image/jpeg");
+        addFile("/p/unread.jpg", "image/jpeg");
+        m_db->exec(QStringLiteral("INSERT INTO image VALUES (%1, '2014-05-02T00:00:00', 64, 48, 6), (%2, '2014-05-01T00:00:00', 1, 2, 0)")
+                           .arg(late).arg(early));
+        Batches batches;
+        QVERIFY(photos.query(&batches, QueryAgent::Parameters()));
+        QCOMPARE(batches.names, (QStringList { "early", "late" }));
+        QCOMPARE(roles(batches.all.at(1), 12), QStringLiteral("%1|file:///p/late.jpg|image/jpeg|late.jpg|/p/late.jpg|late|false|"
+                                                              "NULL|2014-05-02T00:00:00.000|64|48|6").arg(late).replace("NULL", QString()));
+
+        // The lookups name a table that was never there: each fails with its records, and gives nothing.
+        MessageLog log(false);
+        QVERIFY(!photos.queryById(late).isValid() && !photos.queryByUrl(QUrl::fromLocalFile("/p/late.jpg")).isValid()
+                && !photos.queryByUrl(QUrl("http://example.com/late.jpg")).isValid());
+        QCOMPARE(log.warnings().filter("no such table: photo").size(), 3);
+        QCOMPARE(log.warnings().filter("Content PhotoQueryAgent::querySinglePhoto(QSqlQuery&)").size(), 3);
     }
 
     void batches_data()

@@ -14,6 +14,7 @@
 #include <QtTest>
 
 #include <functional>
+#include <utility>
 #include <memory>
 
 namespace {
@@ -413,6 +414,29 @@ private slots:
         QVERIFY(log.of("change").isEmpty());
         QCOMPARE(displayNames(model), numbered(10));
         QCOMPARE(model.index(0, 0).data(FileData::CategoryRole).toString(), "Ringtone");
+
+        // A handler of a row signal turns the filter on in the middle of a merge:
+        // the merge ends on the full list first.
+        m_db->exec("DELETE FROM file WHERE displayName = 'n0003'");
+        addFiles({ "n0005a", "n0007a" });
+        bool once = true;
+        const auto filterNow = [&]() {
+            if (std::exchange(once, false)) {
+                model.filter = [](const Content &) { return false; };
+                model.setFiltered(true);
+            }
+        };
+        const auto removed = connect(&model, &QAbstractItemModel::rowsRemoved, this, filterNow);
+        const auto inserted = connect(&model, &QAbstractItemModel::rowsInserted, this, filterNow);
+        model.requery();
+        QVERIFY(waitDone(model));
+        disconnect(removed);
+        disconnect(inserted);
+        QVERIFY(!once);
+        QCOMPARE(model.count(), 0);
+        model.setFiltered(false);
+        QCOMPARE(displayNames(model), QStringList({ "n0000", "n0001", "n0002", "n0004", "n0005", "n0005a", "n0006",
+                                                    "n0007", "n0007a", "n0008", "n0009" }));
     }
 };
 

@@ -116,6 +116,9 @@ private slots:
                 failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
         // By kind, not in the order of the events: deletes last.
         QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
+        QTest::newRow("IN_MODIFY of a known file") << Case { 0, "touch a b", "a b", "echo x >> a", "/ a|0 b|1", 2 };
+        // The scope 3 watch reports changes only: no new files.
+        QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
         // Scope 1 doesn't add files.
         QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
         QStringList many { "/" };
@@ -126,9 +129,17 @@ private slots:
         QTest::newRow("unknown watch, hidden file") << Case { 0, "", "", "?touch ../foreign mine .h", "/ +.h|0 +mine|0", 2 };
         QTest::newRow("name not in UTF-8") << Case { 0, "", "", "touch \"$(printf 'bad\\377')\" ok", "/ +ok|0", 2,
                 { "^Skipping a file name that is not valid UTF-8 \".*/\" \"bad\\\\xFF\"$" } };
+        // Read as the scan reads it, so that events and scans agree on the name. (SQLite drops the
+        // U+FEFF of a bound name as a byte order mark.)
+        const auto bom = [](char c) { return QString("\"$(printf '\\357\\273\\277%1')\"").arg(c); };
+        QTest::newRow("leading U+FEFF") << Case { 0, "touch " + bom('b'), "", "rm " + bom('b') + "; touch " + bom('c'), "/ +c|0", 2 };
         const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
         QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
         QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
+        QTest::newRow("IN_MOVE_SELF") << Case { 0, tree, treeRows, "mv S ../moved-S", "/ r|1", 4 }; // and the IN_IGNORED of the removed watch
+        // Swapped for a link between the event that queues it and its scan.
+        QTest::newRow("directory now a link") << Case { 0, "mkdir -p ../outside; touch ../outside/secret", "",
+                "mkdir N; rmdir N; ln -s ../outside N", "/ N/ +N|0", 2, { "^Skipping a directory that is a symbolic link \".*/N\"$" } };
         // The failed watch is reported and the scan goes on, finding nothing.
         QTest::newRow("directory gone before its scan") << Case { 0, "", "", "mkdir N; rmdir N", "/ N/", 3,
                                                                   { "^Failed to add listener -1 \".*/N\"$" } };
@@ -164,11 +175,24 @@ private slots:
 
     void appendDirectory()
     {
+        // Times of both passes through the repeated hour of Helsinki's autumn clock change.
         const QString root = uniquePath();
-        run(root, "touch f");
+        run(root, "touch f; touch -d @1761438600 early; touch -d @1761442200 late");
+        const QByteArray zone = qgetenv("TZ");
+        setTimeZone("Europe/Helsinki");
         FileManager manager(DbManager::instance(), nullptr);
         const qint64 id = manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew);
         QVERIFY(id > 0 && waitIdle());
+
+        // A restart in another zone finds both stored times equal to the files'.
+        m_sql.exec("UPDATE file SET metadataCurrent = 1 WHERE fileName IN ('early', 'late');");
+        setTimeZone("Asia/Tokyo");
+        {
+            FileManager restarted(DbManager::instance(), nullptr);
+            QVERIFY(waitIdle());
+        }
+        setTimeZone(zone);
+        QCOMPARE(tree(root), QString("+early|1 +f|0 +late|1 /"));
         addRows(root, "absent");
 
         QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew), id);
@@ -179,7 +203,7 @@ private slots:
         QCOMPARE(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanAlways), id);
         QVERIFY(manager.isUpdateQueued());
         QVERIFY(waitIdle());
-        QCOMPARE(tree(root), QString("/ absent|1 f|0"));
+        QCOMPARE(tree(root), QString("/ absent|1 early|1 f|0 late|1"));
 
         // A new scope without a scan removes the watch; unwatched, ScanAlways scans.
         QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::NoScan), id);
@@ -190,7 +214,7 @@ private slots:
         QCOMPARE(pendingBytes(manager), 0);
         QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::ScanAlways), id);
         QVERIFY(waitIdle());
-        QCOMPARE(tree(root), QString("/ f|0"));
+        QCOMPARE(tree(root), QString("/ early|1 f|0 late|1"));
     }
 
     void insertFile()

@@ -54,7 +54,7 @@ private slots:
         add("locale catalogue", { translated }, QStringList("a.ogg|Suomi A|NULL|0") + others, {}, "fi_FI");
         // Wrong types count as absent; "a.ogg" and "./a.ogg" are names, not rows.
         add("skipped elements", { R"({"files": [{"fileName": "b.ogg", "displayName": "B", "category": "x", "more": 1}, 7, )"
-            R"("a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"}, )"
+            R"("a.ogg", {}, {"fileName": ""}, {"fileName": "./a.ogg"}, {"fileName": "missing.ogg"}, {"fileName": "."}, {"fileName": ".."}, )"
             R"({"fileName": "a.ogg", "displayName": 5, "category": ["x"]}]})" }, { "a.ogg|NULL|NULL|0", "b.ogg|B|x|0" });
         add("duplicate", { R"({"files": [{"fileName": "c.ogg"}, {"fileName": "a.ogg"}, {"fileName": "c.ogg"}]})" },
             { "a.ogg|NULL|NULL|0", "c.ogg|NULL|NULL|0" },
@@ -108,11 +108,24 @@ private slots:
 
         // A notice only when rows change, one file a call; a FIFO is passed over, not waited for.
         SignalRecorder::clear();
-        QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
+        QVERIFY(!FileManager::instance()->isUpdateQueued() && m_db.exec(markStale) && indexes->updateMetaData());
         QCOMPARE(SignalRecorder::calls(), QList<int>());
+        // Pictures named by an index are read by the other loop: its step is queued.
+        QVERIFY(FileManager::instance()->isUpdateQueued() && waitIdle());
         QVERIFY(write(index, R"({"files": [{"fileName": "a.ogg", "displayName": "A"}]})") && m_db.exec(markStale));
         QVERIFY(indexes->updateMetaData() && !indexes->updateMetaData());
         QCOMPARE(SignalRecorder::calls(), QList<int> { 0 });
+        // A described directory that is a link is not followed.
+        const QString outside = uniquePath();
+        QVERIFY(write(outside + QStringLiteral("/b.ogg")) && QDir(tones()).removeRecursively() && QFile::link(outside, tones()));
+        QVERIFY(write(index, R"({"files": [{"fileName": "b.ogg"}]})") && m_db.exec(markStale));
+        QTest::ignoreMessage(QtWarningMsg, qPrintable("Skipping a directory that is a symbolic link \"" + tones() + '"'));
+        QVERIFY(indexes->updateMetaData());
+        QCOMPARE(m_db.fileRows(tones(), "fileName"), QStringList { "a.ogg" });
+        // A sparse giant is not read into memory; the rows stay.
+        QVERIFY(QFile::resize(index, 5 << 20) && m_db.exec(markStale));
+        QTest::ignoreMessage(QtWarningMsg, qPrintable("Skipping a file of more than 4194304 bytes \"" + index + '"'));
+        QVERIFY(indexes->updateMetaData());
         QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
         QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
     }

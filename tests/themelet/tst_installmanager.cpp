@@ -85,12 +85,16 @@ private slots:
         // As if read, and as if a writable row had been left behind.
         const QString markRead = "UPDATE file SET metadataCurrent = 1, permissions = 3 WHERE directoryId = " + m_db.directoryId(package);
 
-        // Unchanged: nothing to update, but the ZEF id is bound; an empty one keeps it.
+        // Unchanged, also seen from another time zone: nothing to update, but the
+        // ZEF id is bound; an empty one keeps it.
+        const QByteArray zone = qgetenv("TZ");
+        setTimeZone("America/St_Johns");
         QVERIFY(m_db.exec(markRead) && installer()->install(package, QStringLiteral("Z1"), false));
+        setTimeZone(zone);
         QVERIFY(write(package + QStringLiteral("/t2.themelet"), "{}") && installer()->install(package, QString(), false));
         QCOMPARE(m_db.fileRows(package, columns), (QStringList { "t1.themelet|3|1|Z1", "t2.themelet|1|0|Z1", "tones.index|3|1|NULL" }));
         QCOMPARE(m_db.fileRows(package, "modificationTime").value(1),
-                 QFileInfo(package + QStringLiteral("/t2.themelet")).lastModified().toString(Qt::ISODateWithMs));
+                 QFileInfo(package + QStringLiteral("/t2.themelet")).lastModified().toUTC().toString(Qt::ISODateWithMs));
 
         QVERIFY(m_db.exec(markRead) && installer()->install(package, QStringLiteral("Z2"), true));
         QCOMPARE(m_db.fileRows(package, columns), (QStringList { "t1.themelet|1|0|Z2", "t2.themelet|1|0|Z2", "tones.index|1|0|NULL" }));

@@ -31,10 +31,15 @@ class tst_ThemeletManager : public QObject
     ThemeletManager *m_manager = nullptr;
     TestDatabase m_db { serviceIndex() };
 
-    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), unread row.
+    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), images/out.jpg
+    // and sounds/out.ogg linked to a file outside, unread row.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
         writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
+        const QString outside = user("outside");
+        write(outside);
+        QFile::link(outside, package(name) + "/images/out.jpg");
+        QFile::link(outside, package(name) + "/sounds/out.ogg");
         write(package(name) + '/' + name + ".themelet", json);
         m_db.exec({ QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 2)").arg(package(name)),
                     QStringLiteral("INSERT INTO file (directoryId, mimeType, fileName, permissions, metadataCurrent) SELECT MAX(id), "
@@ -90,14 +95,16 @@ private slots:
     void translation()
     {
         // One batch in directory order. After a file without a catalogue the same catalogue stays off.
-        const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset" };
+        // A path is no catalogue, even one that leads to the right place.
+        const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset",
+                                     "../translations/themelet-sunset" };
         for (int i = 0; i < catalogs.size(); ++i)
             addThemelet(QString::number(i), QStringLiteral(R"({"wallpaper": "w.jpg", "translationCatalog": "%1", )"
                     R"("displayName": "themelet-la-%2"})").arg(catalogs[i], i == 2 ? "dusk" : "sunset").toUtf8());
         m_manager->updateMetaData();
         QCOMPARE(m_db.rows("SELECT displayName FROM file JOIN themelet ON fileId = id ORDER BY id"), (QStringList {
                 "themelet-la-sunset", "Auringonlasku", "Dusk" /* empty in the locale catalogue */, "themelet-la-sunset",
-                "themelet-la-sunset" }));
+                "themelet-la-sunset", "themelet-la-sunset" }));
         // A new batch starts with nothing remembered.
         m_db.exec("UPDATE file SET metadataCurrent = 0 WHERE fileName = '4.themelet'");
         m_manager->updateMetaData();
@@ -116,6 +123,9 @@ private slots:
         add("only wallpaper", R"("w.jpg")", defaults);
         add("slash in wallpaper", R"("images/w.jpg")", "");
         add("missing wallpaper file", R"("gone.jpg")", "");
+        add("wallpaper ..", R"("..")", "");
+        add("wallpaper a directory", R"("images")", "");
+        add("wallpaper linked out of the package", R"("out.jpg")", "");
         add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|now");
         add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
             R"("timestamp": "2014-05-01T12:00:00.250Z")", "0|150|-1|1|NULL|p|2014-05-01T12:00:00Z");
@@ -128,6 +138,9 @@ private slots:
         add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|now");
         add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
         add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
+        add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
+            R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
+        add("unpaired surrogates", R"("w.jpg", "partnerSpace": "a\ud800b\udc00")", "1|80|-1|1|NULL|a\uFFFDb\uFFFD|now");
         add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
             R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"
@@ -160,6 +173,12 @@ private slots:
         QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
         QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
                                    << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
+        // Valid, but too large to be read: unreadable like a missing file, not malformed.
+        QTest::newRow("too large, with a row") << QByteArray(R"({"wallpaper": "w.jpg"})").append(4 << 20, ' ') << 41
+                << QStringList { "^Skipping a file of more than 4194304 bytes \"" + QRegularExpression::escape(package("bad")) + "/bad\\.themelet\"$" }
+                        + failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
+                                  "INSERT INTO themelet ( fileId,")
+                << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
         QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
         // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
         QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
@@ -374,6 +393,14 @@ private slots:
         data->url = QUrl::fromLocalFile(user("new/moved.themelet"));
         data->displayName = "Moved";
         QCOMPARE(m_manager->create(themelet), id);
+        QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
+        // A url that names no local file moves nothing.
+        for (const QUrl &url : { QUrl(), QUrl("http://example.com/moved.themelet") }) {
+            data->url = url;
+            QTest::ignoreMessage(QtWarningMsg, "qint64 ThemeletManager::create(const Themelet&)");
+            QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id).arg(url.toString())));
+            QCOMPARE(m_manager->create(themelet), 0);
+        }
         QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
         // Nothing to act on: no themelet, no file, an unknown id.
         QCOMPARE(m_manager->create(Themelet()) + m_manager->create(Themelet(new ThemeletData(0, QUrl::fromLocalFile(user("gone"))))), 0);

@@ -1,0 +1,17 @@
+#ifndef DECLARATIVEPLUGIN_H
+#define DECLARATIVEPLUGIN_H
+
+#include <QQmlExtensionPlugin>
+
+// The entry of the QML module. Loading it only registers types: no daemon
+// proxy, thread or database exists until the first object needs one.
+class DeclarativePlugin : public QQmlExtensionPlugin
+{
+    Q_OBJECT
+    Q_PLUGIN_METADATA(IID "Orbaline.Themelet")
+public:
+    void registerTypes(const char *uri) override;
+    void initializeEngine(QQmlEngine *engine, const char *uri) override;
+};
+
+#endif

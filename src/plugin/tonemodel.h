@@ -1,0 +1,26 @@
+#ifndef TONEMODEL_H
+#define TONEMODEL_H
+
+#include "contentmodel.h"
+
+#include <QStringList>
+
+// The sounds of the install directories, ringtones first.
+class ToneModel : public ContentModel<FileData>
+{
+    Q_OBJECT
+public:
+    explicit ToneModel(QObject *parent = nullptr);
+
+    void componentComplete() override;
+
+private slots:
+    void contentChanged(int type);
+
+private:
+    QueryAgent::Parameters *parameters() const;
+
+    const QStringList m_categories;
+};
+
+#endif

@@ -1,0 +1,88 @@
+// Writes the content that the QML tests list and the index of it, as the
+// service would, in another process than the client under test.
+//
+//   qmlfixture            themelets, tones and photos, then the index
+//   qmlfixture photo NAME one more photo in the watched directory
+#include "indexfixture.h"
+#include "sysroot.h"
+
+#include <QGuiApplication>
+
+using namespace Fixture;
+
+namespace {
+
+QString pictures()
+{
+    return qEnvironmentVariable("THEMELET_SANDBOX") + QStringLiteral("/pictures");
+}
+
+bool writePhoto(const QString &name, int day)
+{
+    const QString date = QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:%1 12:00:00").arg(day, 2, 10, QLatin1Char('0'));
+    return writeJpeg(pictures() + QLatin1Char('/') + name, { date });
+}
+
+QByteArray themelet(const QString &name, int day, const QString &tone = QString())
+{
+    QString text = QStringLiteral(R"({"wallpaper": "%1.jpg", "displayName": "%2", "timestamp": "2014-05-%3T12:00:00",)"
+                                  R"( "highlightColor": "#ffcc66", "version": 2)")
+                           .arg(name.toLower(), name)
+                           .arg(day, 2, 10, QLatin1Char('0'));
+    if (!tone.isEmpty())
+        text += QStringLiteral(R"(, "ringerToneFile": {"file": "%1", "enabled": 1})").arg(tone);
+    return (text + QLatin1Char('}')).toUtf8();
+}
+
+bool writeContent()
+{
+    // Favourites come first, each group by time; Ocean is made a non-favourite below.
+    const QString package = Sysroot::path(QStringLiteral("/usr/share/themelet/nature"));
+    if (!writeTree(package, { "images/aurora.jpg", "images/forest.jpg", "images/ocean.jpg", "sounds/dusk.ogg" }, "x")
+            || !write(package + "/aurora.themelet", themelet("Aurora", 2, "dusk.ogg"))
+            || !write(package + "/forest.themelet", themelet("Forest", 1))
+            || !write(package + "/ocean.themelet", themelet("Ocean", 3)))
+        return false;
+
+    // An index describes the directory of its own name.
+    const QString tones = Sysroot::path(QStringLiteral("/usr/share/sounds/pack/tones"));
+    const QByteArray index = R"({"files": [{"fileName": "alarm.ogg", "displayName": "Alarm", "category": "Default"},)"
+                             R"( {"fileName": "beep.ogg", "displayName": "Beep", "category": "Other"},)"
+                             R"( {"fileName": "custom.ogg", "displayName": "Custom", "category": "Customer"},)"
+                             R"( {"fileName": "ring.ogg", "displayName": "Ring", "category": "Ringtone"}]})";
+    if (!writeTree(tones, { "alarm.ogg", "beep.ogg", "custom.ogg", "ring.ogg" }, "x") || !write(tones + ".index", index))
+        return false;
+
+    return QDir().mkpath(pictures()) && writePhoto("b.jpg", 1) && writePhoto("ab.jpg", 2) && writePhoto("a.jpg", 3)
+            && writePhoto("abc.jpg", 4);
+}
+
+}
+
+int main(int argc, char **argv)
+{
+    QGuiApplication app(argc, argv);
+    const QStringList arguments = app.arguments().mid(1);
+
+    DbManager::instance();
+    FileManager *files = FileManager::instance();
+    if (!files)
+        return 1;
+    if (arguments.value(0) == QLatin1String("photo")) {
+        if (!writePhoto(arguments.value(1), 5))
+            return 1;
+        files->appendDirectory(pictures(), FileManager::UserScope, FileManager::ScanAlways);
+        return waitIdle() ? 0 : 1;
+    }
+
+    if (!writeContent())
+        return 1;
+    for (const QString &path : InstallManager::installPaths())
+        installer()->appendDirectory(path);
+    files->appendDirectory(pictures(), FileManager::UserScope, FileManager::ScanAlways);
+    if (!waitIdle())
+        return 1;
+    TestDatabase db;
+    return db.exec(QStringLiteral("UPDATE themelet SET favorite = 0 WHERE fileId = "
+                                   "(SELECT id FROM file WHERE fileName = 'ocean.themelet')")) ? 0 : 1;
+}

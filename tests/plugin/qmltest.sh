@@ -1,0 +1,16 @@
+#!/usr/bin/env bash
+# Runs one QML test file in the sandbox that sandbox.sh made: the index is
+# written first by another process (the fixture), then qmltestrunner runs the
+# file. Every QML warning counts as a failure.
+#   qmltest.sh <fixture> <qmltestrunner> <tst_file.qml>
+set -u
+export THEMELET_QML_FIXTURE=$1
+"$THEMELET_QML_FIXTURE" || { echo "FAIL: the fixture could not write the index"; exit 1; }
+log="$THEMELET_SANDBOX/qmltest.txt"
+"$2" -input "$3" -o "$log,txt" -o -,txt
+status=$?
+if grep -q '^QWARN' "$log"; then
+    echo "FAIL: QML warnings (the QWARN lines above) count as failures"
+    [ "$status" -ne 0 ] || status=1
+fi
+exit "$status"

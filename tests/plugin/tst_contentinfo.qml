@@ -1,0 +1,130 @@
+import QtQuick 2.0
+import QtTest 1.2
+import Orbaline.Themelet 1.0
+import ThemeletTesting 1.0
+
+TestCase {
+    id: test
+    name: "ContentInfo"
+
+    readonly property string nature: "file://" + Fixture.sandbox + "/sysroot/usr/share/themelet/nature/"
+
+    RecordingService { id: service }
+
+    Component {
+        id: themeletInfo
+        ContentInfo {
+            contentType: ContentInfo.Themelet
+            property string displayName
+            property color highlightColor
+            property bool favorite
+            property string notARole: "kept"
+            // A map-valued role, two levels deep.
+            readonly property QtObject resources: QtObject {
+                readonly property QtObject ringerToneFile: QtObject {
+                    property url url
+                    property string fileName
+                }
+            }
+        }
+    }
+
+    SignalSpy { id: changedSpy; signalName: "changed" }
+
+    function initTestCase() {
+        verify(service.start())
+    }
+
+    function init() {
+        service.clear()
+    }
+
+    function waitForCalls(count) {
+        tryVerify(function() { return service.calls().length >= count })
+        wait(50)
+        compare(service.calls().length, count)
+        return service.calls()
+    }
+
+    function loaded(name) {
+        var info = createTemporaryObject(themeletInfo, test, { url: nature + name + ".themelet" })
+        verify(info.contentId !== 0)
+        return info
+    }
+
+    function test_loadByUrl() {
+        var info = createTemporaryObject(themeletInfo, test)
+        changedSpy.target = info
+        changedSpy.clear()
+        info.url = nature + "aurora.themelet"
+        compare(changedSpy.count, 1)
+        verify(info.contentId > 0)
+        compare(info.url, nature + "aurora.themelet")
+        compare(info.displayName, "Aurora")
+        compare(info.highlightColor, "#ffcc66")
+        compare(info.favorite, true)
+        compare(info.notARole, "kept")
+        compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
+        compare(String(info.resources.ringerToneFile.url), nature + "sounds/dusk.ogg")
+
+        // Not indexed: nothing loads, and no changed().
+        info.url = nature + "none.themelet"
+        compare(info.contentId, 0)
+        compare(changedSpy.count, 1)
+    }
+
+    // Only the changed leaf of the nested group goes, beside a changed plain property.
+    function test_saveNestedLeaf() {
+        var info = loaded("aurora")
+        var id = info.contentId
+        info.resources.ringerToneFile.url = "file:///tones/new.ogg"
+        info.highlightColor = "#80112233"
+        info.save()
+        compare(waitForCalls(1), [{ method: "saveAttributes", arguments: [1, id, {
+            resources: { ringerToneFile: { url: "file:///tones/new.ogg" } },
+            highlightColor: "#80112233" }] }])
+        // The local values stay until the next load.
+        compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
+    }
+
+    // A load writes every bound property; none of that is a change to save.
+    function test_loadIsNotAChange() {
+        var info = loaded("aurora")
+        info.save()
+        info.contentId = loaded("forest").contentId
+        compare(info.displayName, "Forest")
+        compare(info.url, nature + "forest.themelet")
+        info.save()
+        info.displayName = "Woods"
+        info.save()
+        compare(waitForCalls(1), [{ method: "saveAttributes", arguments: [1, info.contentId, { displayName: "Woods" }] }])
+    }
+
+    // A change notice of the item's type loads again and drops what wasn't saved.
+    function test_reloadDropsChanges() {
+        var info = loaded("forest")
+        info.displayName = "Woods"
+        verify(service.emitContentChanged(0))
+        verify(service.emitContentChanged(1))
+        tryCompare(info, "displayName", "Forest")
+        info.save()
+        info.displayName = "Glade"
+        info.save()
+        compare(waitForCalls(1)[0].arguments[2], { displayName: "Glade" })
+    }
+
+    function test_remove() {
+        var info = loaded("ocean")
+        var id = info.contentId
+        info.displayName = "Sea"
+        info.remove()
+        compare(info.contentId, 0)
+        compare(info.url, nature + "ocean.themelet")
+        info.save()
+        compare(waitForCalls(1), [{ method: "remove", arguments: [1, id] }])
+        // Tried already: a notice doesn't bring it back.
+        verify(service.emitContentChanged(1))
+        wait(200)
+        compare(info.contentId, 0)
+    }
+}

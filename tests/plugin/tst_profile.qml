@@ -1,0 +1,87 @@
+import QtQuick 2.0
+import QtTest 1.2
+import Orbaline.Themelet 1.0
+import ThemeletTesting 1.0
+
+TestCase {
+    id: test
+    name: "Profile"
+
+    readonly property string profiles: "/org/orbaline/themelet/profiles/"
+
+    Component { id: profileComponent; Profile {} }
+    SignalSpy { id: updatedSpy; signalName: "profileUpdated" }
+    SignalSpy { id: volumeSpy; signalName: "ringerVolumeChanged" }
+    SignalSpy { id: activeSpy; signalName: "activeProfileChanged" }
+
+    function init() {
+        Fixture.dconf(["reset", "-f", "/org/orbaline/themelet/"])
+    }
+
+    function created(properties) {
+        var profile = createTemporaryObject(profileComponent, test, properties || {})
+        updatedSpy.target = volumeSpy.target = activeSpy.target = profile
+        updatedSpy.clear()
+        volumeSpy.clear()
+        activeSpy.clear()
+        return profile
+    }
+
+    // Notices come in the order written: a change of the profile's own unknown key
+    // marks that everything before it has arrived.
+    function barrier(profile) {
+        var before = updatedSpy.count
+        Fixture.dconf(["write", profiles + profile + "/barrier.key", "'" + Math.random() + "'"])
+        tryCompare(updatedSpy, "count", before + 1)
+    }
+
+    function test_readsAnotherProcess() {
+        Fixture.dconf(["write", profiles + "general/ringing.alert.tone", "'/sounds/ring.ogg'"])
+        Fixture.dconf(["write", profiles + "general/sms.alert.enabled", "true"])
+        var profile = created()
+        compare(profile.profile, Profile.General)
+        compare(profile.ringerToneFile, "/sounds/ring.ogg")
+        compare(profile.messageToneEnabled, true)
+        compare(profile.ringerVolume, 0)
+        compare(volumeSpy.count, 1)
+
+        Fixture.dconf(["write", profiles + "general/ringing.alert.volume", "40"])
+        tryCompare(profile, "ringerVolume", 40)
+    }
+
+    function test_writesThrough() {
+        var profile = created({ profile: Profile.Silent })
+        profile.ringerToneFile = "/sounds/new.ogg"
+        profile.clockAlarmToneEnabled = true
+        profile.ringerVolume = 20
+        tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "'/sounds/new.ogg'" })
+        compare(Fixture.dconf(["read", profiles + "silent/clock.alert.enabled"]), "true")
+        compare(Fixture.dconf(["read", profiles + "silent/ringing.alert.volume"]), "20")
+
+        profile.clearTone(Profile.RingerTone)
+        tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "" })
+        compare(Fixture.dconf(["read", profiles + "silent/ringing.alert.volume"]), "20")
+    }
+
+    function test_otherProfileIsSilent() {
+        var profile = created()
+        compare(profile.ringerVolume, 0)
+        volumeSpy.clear()
+        Fixture.dconf(["write", profiles + "silent/ringing.alert.volume", "30"])
+        barrier("general")
+        compare(updatedSpy.count, 1)
+        compare(volumeSpy.count, 0)
+        compare(profile.ringerVolume, 0)
+    }
+
+    function test_activeProfile() {
+        var profile = created({ profile: Profile.Themelet, activateProfileOnChange: true })
+        compare(Fixture.dconf(["read", "/org/orbaline/themelet/profile"]), "'themelet'")
+        compare(profile.activeProfile, Profile.Themelet)
+        tryCompare(activeSpy, "count", 1)
+        profile.activeProfile = Profile.Silent
+        tryCompare(activeSpy, "count", 2)
+        compare(profile.activeProfile, Profile.Silent)
+        compare(profile.profile, Profile.Themelet)
+    }
+}

@@ -1,0 +1,245 @@
+#include "dconftest.h"
+#include "messagelog.h"
+#include "profile.h"
+#include "profilemanager.h"
+
+#include <QtTest>
+
+static const QString s_profiles = QStringLiteral("/org/orbaline/themelet/profiles/");
+static int s_heard = 0;
+
+// Every signal of an object by name, in the order they come.
+class SignalLog : public QObject
+{
+    Q_OBJECT
+public:
+    explicit SignalLog(QObject *object)
+    {
+        const QMetaObject *meta = object->metaObject();
+        const int slot = staticMetaObject.indexOfSlot("record()");
+        for (int i = QObject::staticMetaObject.methodCount(); i < meta->methodCount(); ++i) {
+            if (meta->method(i).methodType() == QMetaMethod::Signal)
+                QMetaObject::connect(object, i, this, slot);
+        }
+    }
+    QStringList names;
+
+private slots:
+    void record() { names << QString::fromLatin1(sender()->metaObject()->method(senderSignalIndex()).name()); }
+};
+
+// Whether a value callback of the test's own hears a change written by another process,
+// which it does only while the profile tracker runs.
+static bool trackerRuns()
+{
+    static int round = 0;
+    s_heard = 0;
+    DConfTest::write(s_profiles + "silent/custom.key", QString::number(++round));
+    return DConfTest::barrier() && s_heard > 0;
+}
+
+class tst_ProfileManager : public QObject
+{
+    Q_OBJECT
+private slots:
+    void initTestCase()
+    {
+        profile_track_add_change_cb([](const char *, const char *, const char *, const char *, void *) { ++s_heard; }, nullptr, nullptr);
+    }
+
+    void init()
+    {
+        DConfTest::reset(QStringLiteral("/org/orbaline/themelet/"));
+        QVERIFY(DConfTest::barrier());
+    }
+
+    // The first object starts the tracker and the last one stops it, counting objects only: a
+    // tracker stopped by someone else while objects live stays stopped for a second object.
+    void instanceCounting()
+    {
+        QVERIFY(!trackerRuns());
+        auto *first = new ProfileManager;
+        QVERIFY(trackerRuns());
+        auto *second = new ProfileManager;
+        delete first;
+        QVERIFY(trackerRuns());
+        delete second;
+        QVERIFY(!trackerRuns());
+
+        first = new ProfileManager;
+        profile_tracker_quit();
+        second = new ProfileManager;
+        QVERIFY(!trackerRuns());
+        delete second;
+        delete first;
+        ProfileManager third;
+        QVERIFY(trackerRuns());
+    }
+
+    // Rows: the object's profile, a value of another process (profile/key and GVariant text),
+    // the signals in order, and the properties read afterwards.
+    void notices_data()
+    {
+        QTest::addColumn<ProfileManager::Profile>("profile");
+        QTest::addColumn<QString>("path");
+        QTest::addColumn<QString>("value");
+        QTest::addColumn<QStringList>("signalNames");
+        QTest::addColumn<QString>("read");
+
+        const QStringList updated { "profileUpdated" };
+        QTest::newRow("volume") << ProfileManager::General << "general/ringing.alert.volume" << "30"
+                                << QStringList { "ringerVolumeChanged", "profileUpdated" } << "30 /cached.ogg /chat.ogg 0";
+        QTest::newRow("tone of an inactive profile") << ProfileManager::Silent << "silent/sms.alert.tone" << "'/new.ogg'"
+                                                     << QStringList { "messageToneFileChanged", "profileUpdated" }
+                                                     << "0 /new.ogg /chat.ogg 0";
+        QTest::newRow("switch") << ProfileManager::General << "general/email.alert.enabled" << "'on'"
+                                << QStringList { "mailToneEnabledChanged", "profileUpdated" } << "0 /cached.ogg /chat.ogg 1";
+        QTest::newRow("chat tone reaches only profileUpdated") << ProfileManager::General << "general/im.alert.tone"
+                                                               << "'/other.ogg'" << updated << "0 /cached.ogg /chat.ogg 0";
+        QTest::newRow("unknown key") << ProfileManager::General << "general/custom.key" << "'x'" << updated
+                                     << "0 /cached.ogg /chat.ogg 0";
+        QTest::newRow("unknown profile") << ProfileManager::Unknown << "general/ringing.alert.volume" << "30"
+                                         << QStringList() << "0 /cached.ogg /chat.ogg 0";
+    }
+
+    void notices()
+    {
+        QFETCH(ProfileManager::Profile, profile);
+        QFETCH(QString, path);
+        QFETCH(QString, value);
+        QFETCH(QStringList, signalNames);
+        QFETCH(QString, read);
+
+        const QByteArray name = profile == ProfileManager::Silent ? "silent" : "general";
+        QVERIFY(profile_set_value_as_int(name, "ringing.alert.volume", 0) == 0
+                && profile_set_value(name, "sms.alert.tone", "/cached.ogg") == 0
+                && profile_set_value(name, "im.alert.tone", "/chat.ogg") == 0);
+        QVERIFY(DConfTest::barrier());
+
+        if (profile == ProfileManager::Unknown)
+            QTest::ignoreMessage(QtWarningMsg, "QByteArray _profileName(ProfileManager::Profile) Unknown profile");
+        ProfileManager manager;
+        manager.setProfile(profile);
+        QCOMPARE(manager.profile(), profile);
+        const auto readAll = [&] {
+            return QStringList { QString::number(manager.ringerVolume()), manager.messageToneFile(), manager.chatToneFile(),
+                                 QString::number(manager.mailToneEnabled()) }.join(' ');
+        };
+        if (profile != ProfileManager::Unknown)
+            QCOMPARE(readAll(), "0 /cached.ogg /chat.ogg 0");
+
+        SignalLog log(&manager);
+        DConfTest::write(s_profiles + path, value);
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(log.names, signalNames);
+        if (profile != ProfileManager::Unknown)
+            QCOMPARE(readAll(), read);
+    }
+
+    // Reads ask the library once; writes compare with the cache, except that an empty tone
+    // is always written; a first volume read signals.
+    void cacheAndWrites()
+    {
+        QVERIFY(profile_set_value("general", "ringing.alert.volume", "0") == 0);
+        ProfileManager manager;
+        SignalLog log(&manager);
+        QCOMPARE(manager.ringerVolume(), 0);
+        QCOMPARE(manager.ringerVolume(), 0);
+        QCOMPARE(log.names, QStringList { "ringerVolumeChanged" });
+
+        log.names.clear();
+        manager.setRingerToneFile("/a.ogg");
+        manager.setRingerToneFile("/a.ogg");
+        manager.setRingerToneFile("");
+        manager.setRingerToneFile("");
+        manager.setClockAlarmToneEnabled(true);
+        manager.setClockAlarmToneEnabled(true);
+        manager.setRingerVolume(0);
+        QCOMPARE(log.names, (QStringList { "ringerToneFileChanged", "ringerToneFileChanged", "ringerToneFileChanged",
+                                           "clockAlarmToneEnabledChanged" }));
+    }
+
+    // The clearing calls touch no cache and signal nothing themselves; what they cleared
+    // comes back as notices, in the order written.
+    void clearing_data()
+    {
+        QTest::addColumn<QString>("call");
+        QTest::addColumn<int>("id");
+        QTest::addColumn<QStringList>("keys");
+
+        const QStringList tones { "ringing", "sms", "im", "email", "voip", "calendar", "clock" };
+        QStringList all { "ringing.alert.volume" };
+        for (const QString &suffix : { ".alert.tone", ".alert.enabled" }) {
+            for (const QString &tone : tones)
+                all << tone + suffix;
+        }
+        QTest::newRow("clear") << "clear" << 0 << all;
+        QTest::newRow("settings of a tone") << "clearToneSettings" << int(ProfileManager::ChatTone)
+                                            << QStringList { "im.alert.tone", "im.alert.enabled" };
+        QTest::newRow("tone only") << "clearTone" << int(ProfileManager::ClockAlarmTone) << QStringList { "clock.alert.tone" };
+        QTest::newRow("tone 0 is the volume") << "clearTone" << 0 << QStringList { "ringing.alert.volume" };
+        QTest::newRow("settings of id 8") << "clearToneSettings" << 8 << QStringList();
+        QTest::newRow("tone -1") << "clearTone" << -1 << QStringList();
+    }
+
+    void clearing()
+    {
+        QFETCH(QString, call);
+        QFETCH(int, id);
+        QFETCH(QStringList, keys);
+
+        ProfileManager manager;
+        const QStringList tones { "ringing", "sms", "im", "email", "voip", "calendar", "clock" };
+        QVERIFY(profile_set_value_as_int("general", "ringing.alert.volume", 5) == 0);
+        for (const QString &tone : tones) {
+            QVERIFY(profile_set_value("general", (tone + ".alert.tone").toUtf8(), "/t.ogg") == 0
+                    && profile_set_value_as_bool("general", (tone + ".alert.enabled").toUtf8(), 1) == 0);
+        }
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(manager.ringerVolume(), 5);
+        QCOMPARE(manager.chatToneFile(), "/t.ogg");
+
+        static QStringList s_keys;
+        s_keys.clear();
+        const profile_track_value_fn record = [](const char *, const char *key, const char *, const char *, void *) {
+            s_keys << QString::fromUtf8(key);
+        };
+        profile_track_add_active_cb(record, nullptr, nullptr);
+        SignalLog log(&manager);
+        const char *signature = call == "clearTone" ? "void ProfileManager::clearTone(ProfileManager::ToneId)"
+                                                    : "void ProfileManager::clearToneSettings(ProfileManager::ToneId)";
+        MessageLog messages(keys.isEmpty() ? QStringList { QStringLiteral("warning: %1 Unknown tone id!").arg(signature) }
+                                           : QStringList());
+        if (call == "clear")
+            manager.clear();
+        else if (call == "clearTone")
+            manager.clearTone(ProfileManager::ToneId(id));
+        else
+            manager.clearToneSettings(ProfileManager::ToneId(id));
+        QCOMPARE(log.names, QStringList());
+        QCOMPARE(manager.ringerVolume(), 5);
+        QVERIFY(DConfTest::barrier());
+        profile_track_remove_active_cb(record, nullptr);
+        QCOMPARE(s_keys, keys);
+        QCOMPARE(manager.chatToneFile(), "/t.ogg"); // the gap: a cleared chat tone isn't noticed
+    }
+
+    // Orders that QML and tools see: signals and invokables of the meta-object.
+    void metaObjectOrder()
+    {
+        QStringList signalNames, methods;
+        const QMetaObject &meta = ProfileManager::staticMetaObject;
+        for (int i = meta.methodOffset(); i < meta.methodCount(); ++i)
+            (meta.method(i).methodType() == QMetaMethod::Signal ? signalNames : methods) << meta.method(i).methodSignature();
+        QCOMPARE(signalNames.join(' '),
+                 "profileChanged() ringerVolumeChanged() ringerToneFileChanged() messageToneFileChanged() "
+                 "messageToneVolumeChanged() internetCallToneFileChanged() chatToneFileChanged() mailToneFileChanged() "
+                 "calendarToneFileChanged() clockAlarmToneFileChanged() ringerToneEnabledChanged() messageToneEnabledChanged() "
+                 "chatToneEnabledChanged() mailToneEnabledChanged() internetCallToneEnabledChanged() calendarToneEnabledChanged() "
+                 "clockAlarmToneEnabledChanged() activeProfileChanged() activateProfileOnChangeChanged() profileUpdated()");
+        QCOMPARE(methods.join(' '), "clear() clearToneSettings(ToneId) clearTone(ToneId)");
+    }
+};
+
+QTEST_GUILESS_MAIN(tst_ProfileManager)
+#include "tst_profilemanager.moc"
