@@ -99,7 +99,7 @@ private slots:
         QVERIFY(m_database->open());
     }
 
-    void init() { m_db->exec("DELETE FROM directory"); } // the triggers take every other row along
+    void init() { m_db->exec({ "DELETE FROM directory", "DELETE FROM themelet" }); } // the triggers take the other rows along
 
     void statementCache()
     {
@@ -229,10 +229,13 @@ private slots:
                                     "highlightColor = '#112233', secondaryHighlightColor = '#80445566', primaryColor = '#778899', "
                                     "secondaryColor = '#aabbcc', ringerVolume = NULL, enabledSounds = 5, version = 3 WHERE fileId = %1").arg(themelet),
                      QStringLiteral("INSERT INTO zefId VALUES (%1, 'zef')").arg(themelet),
-                     QStringLiteral("INSERT INTO resource VALUES (%1, 'ringerTone', %2)").arg(themelet).arg(addFile("/r/sea.ogg")),
+                     QStringLiteral("INSERT INTO resource VALUES (%1, 'ringerTone', %2), (-1, 'ringerTone', %2)").arg(themelet)
+                             .arg(addFile("/r/sea.ogg")),
+                     "INSERT INTO themelet (fileId, favorite, timestamp) VALUES (-1, 1, '001')", // no file row
                      QStringLiteral("INSERT INTO download VALUES (%1, 'http://example.com/t.ogg'), (%2, 'http://example.com/sea.themelet')")
                              .arg(file).arg(themelet) });
-        // Filters 0, 1 and 2: favourites first, then by time; each query's temporary table is gone before the next.
+        // Filters 0, 1 and 2: favourites first, then by time; each query's temporary table is gone before the next,
+        // also when the resource cursor was left standing on the orphan's row ahead of Sea's: Sea gets none ("+").
         ThemeletQueryAgent themelets(*m_database);
         QStringList lists;
         for (int filter : { 0, 1, 2 }) {
@@ -240,6 +243,8 @@ private slots:
             parameters.filter = filter;
             Batches batches;
             QVERIFY(themelets.query(&batches, parameters));
+            for (int i = 0; i < batches.all.size(); ++i)
+                batches.names[i] += batches.all.at(i).data()->data(ThemeletData::ResourcesRole).toMap().isEmpty() ? "" : "+";
             lists << batches.names.join(' ');
         }
         QCOMPARE(lists, (QStringList { "T4 Sea T3 T1", "T4 Sea", "T3 T1" }));

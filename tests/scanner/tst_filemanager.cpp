@@ -248,14 +248,17 @@ private slots:
         SignalRecorder::clear();
 
         // The read alone, as the loop would deliver it: the steps it posts haven't run yet.
-        QVERIFY(QFile::rename(shot, pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
+        // A new directory comes with it: its scan takes the next step, the picture waits.
+        QVERIFY(write(pictures + "/new/a") && QFile::rename(shot, pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
         QEvent read(QEvent::SockAct);
         QCoreApplication::sendEvent(manager, &read);
         const QString state = "SELECT fileName, mimeType, permissions, metadataCurrent, width, height, dateTaken, orientation "
-                              "FROM file LEFT JOIN image ON fileId = id;";
+                              "FROM file LEFT JOIN image ON fileId = id WHERE fileName = 'shot.jpg'";
         QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|0|NULL|NULL|NULL|NULL" });
+        QCoreApplication::sendPostedEvents(manager, QEvent::UpdateRequest);
+        QCOMPARE(m_sql.rows("SELECT fileName, metadataCurrent FROM file ORDER BY fileName"), (QStringList { "a|0", "shot.jpg|0" }));
         QVERIFY(waitIdle());
-        QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 2 }));
+        QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 0, 2 }));
         QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|1|64|48|2014-05-01T12:00:00.000|6" });
     }
 };

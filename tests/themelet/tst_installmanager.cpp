@@ -62,7 +62,23 @@ private slots:
 
         // New r uses up the list in front of row y, which is left for the next
         // scan; z, behind it, goes at once. Every package is installed, new or known.
-        QVERIFY(installFrom(installDir));
+        // Step by step, with a second directory queued: both scans, then each
+        // package in the order found, then the reading of the indexes.
+        QVERIFY(write(installDir + "-2/s/s.index", "{}"));
+        installer()->appendDirectory(installDir);
+        installer()->appendDirectory(installDir + "-2");
+        QStringList steps;
+        for (int i = 0; i < 20; ++i) {
+            QCoreApplication::sendPostedEvents(installer(), QEvent::UpdateRequest);
+            steps << m_db.value(QStringLiteral("SELECT (SELECT group_concat(substr(path, -1), '') FROM (SELECT path FROM directory WHERE "
+                                               "path LIKE '%1%/_' ORDER BY substr(path, -1))) || ' ' || ifnull((SELECT group_concat("
+                                               "substr(fileName, 1, 1) || metadataCurrent, '') FROM (SELECT * FROM file WHERE fileName LIKE "
+                                               "'_.index' ORDER BY id)), '')").arg(installDir)).toString();
+            steps.removeDuplicates();
+        }
+        QVERIFY(waitIdle());
+        QCOMPARE(steps, (QStringList { "abry ", "abrsy ", "abrsy a0", "abrsy a0b0", "abrsy a0b0r0", "abrsy a0b0r0s0",
+                                       "abrsy a1b0r0s0", "abrsy a1b1r0s0", "abrsy a1b1r1s0", "abrsy a1b1r1s1" }));
         QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1", "y|2|0" }));
         QCOMPARE(m_db.rows(knownIds), ids);
         QVERIFY(installFrom(installDir));

@@ -17,6 +17,14 @@ static const QString s_homeKey = QStringLiteral("/desktop/vorka/background/portr
 static QString package(const QString &name) { return Sysroot::path(QStringLiteral("/usr/share/themelet/")) + name; }
 static QString user(const QString &name) { return qEnvironmentVariable("THEMELET_SANDBOX") + "/user/" + name; }
 
+// Every field of a record but the ZEF id, which parseThemelet doesn't read.
+static QVariantList fields(const Themelet &t)
+{
+    return { t->id, t->url, t->type, t->mimeType, t->fileName, t->permissions, t->displayName, t->favorite, t->homeWallpaper,
+             t->applicationWallpaper, t->highlightColor, t->secondaryHighlightColor, t->primaryColor, t->secondaryColor,
+             t->ringerVolume, t->enabledSounds, t->partnerSpace, t->version, t->timestamp, t->resources };
+}
+
 // The timestamp column as an SQL expression, "now" for a time from `since` on.
 static QString timestampSince(const QDateTime &since)
 {
@@ -128,7 +136,9 @@ private slots:
         add("wallpaper linked out of the package", R"("out.jpg")", "");
         add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|now");
         add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
-            R"("timestamp": "2014-05-01T12:00:00.250Z")", "0|150|-1|1|NULL|p|2014-05-01T12:00:00Z");
+            R"("timestamp": "2014-05-01T12:00:00.250Z", "displayName": "Edge", "highlightColor": "#112233", )"
+            R"("secondaryHighlightColor": "#445566", "primaryColor": "#778899", "secondaryColors": "#80aabbcc")",
+            "0|150|-1|1|#112233|p|2014-05-01T12:00:00Z");
         add("enabled false is no number", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": false})",
             defaults, { "ringerToneFile|dusk.ogg" });
         add("enabled 0 keeps the resource", R"("w.jpg", "ringerToneFile": {"file": "dusk.ogg", "enabled": 0})",
@@ -159,6 +169,13 @@ private slots:
         QCOMPARE(m_db.rows("SELECT favorite, ringerVolume, enabledSounds, version, highlightColor, partnerSpace, "
                            + timestampSince(since) + " FROM themelet"), row.isEmpty() ? QStringList() : QStringList { row });
         QCOMPARE(m_db.rows(s_resources), resources);
+
+        // The record by ZEF id has every field that the query agent gives by url.
+        m_db.exec("INSERT INTO zefid SELECT fileId, 'edge' FROM themelet");
+        const Themelet parsed = m_manager->themeletFromZefId("edge");
+        QCOMPARE(parsed.isNull(), row.isEmpty());
+        if (!parsed.isNull())
+            QCOMPARE(fields(parsed), fields(m_manager->themeletFromUrl(parsed->url)));
     }
 
     void malformed_data()
