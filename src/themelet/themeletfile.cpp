@@ -31,7 +31,8 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
         return Unreadable;
 
     QJsonParseError error { 0, QJsonParseError::NoError };
-    const QJsonDocument document = QJsonDocument::fromJson(file.read(s_maximumSize), &error);
+    // Only what the file holds: read(s_maximumSize) would allocate the whole limit each time.
+    const QJsonDocument document = QJsonDocument::fromJson(file.read(qBound<qint64>(0, file.size(), s_maximumSize)), &error);
     if (document.isNull() || !document.isObject()) {
         qWarning() << "Failed to parse themelet file" << path << ", jsonError:" << int(error.error)
                    << ", jsonOffset:" << error.offset;
