@@ -1,0 +1,466 @@
+#include "abstractcontentmodel.h"
+
+#include "themeletinterface.h"
+
+#include <QColor>
+#include <QCoreApplication>
+#include <QJSEngine>
+#include <QJSValueIterator>
+#include <QQmlEngine>
+#include <QThreadPool>
+
+QMutex AbstractContentModel::s_queryMutex;
+
+namespace {
+
+class ContentEvent : public QEvent
+{
+public:
+    static const QEvent::Type s_type = QEvent::User;
+    explicit ContentEvent(const QVector<Content> &content) : QEvent(s_type), content(content) {}
+    const QVector<Content> content;
+};
+
+class QueryCompleteEvent : public QEvent
+{
+public:
+    static const QEvent::Type s_type = QEvent::Type(QEvent::User + 1);
+    explicit QueryCompleteEvent(bool ok) : QEvent(s_type), ok(ok) {}
+    const bool ok;
+};
+
+}
+
+// Runs one query on a pool thread. The model may die meanwhile: it then clears
+// m_model under the mutex and the batches still coming are dropped.
+class AbstractContentModel::QueryRunner : public QRunnable, public QueryAgent::Recipient
+{
+public:
+    QueryRunner(int contentType, AbstractContentModel *model, QueryAgent::Parameters *parameters)
+        : m_parameters(parameters), m_model(model), m_contentType(contentType)
+    {
+    }
+
+    void run() override
+    {
+        QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::Type(m_contentType));
+        const bool ok = agent && agent->query(this, *m_parameters);
+        delete m_parameters;
+        m_parameters = nullptr;
+
+        QMutexLocker locker(&s_queryMutex);
+        if (m_model) {
+            m_model->m_queryRunner = nullptr;
+            QCoreApplication::postEvent(m_model, new QueryCompleteEvent(ok));
+            m_model = nullptr;
+        }
+    }
+
+    ~QueryRunner() override { delete m_parameters; }
+
+    void contentQueried(const QVector<Content> &content) override
+    {
+        // Posted under the lock, so that the model can't go between the test and the post.
+        QMutexLocker locker(&s_queryMutex);
+        if (m_model)
+            QCoreApplication::postEvent(m_model, new ContentEvent(content));
+    }
+
+    QueryAgent::Parameters *m_parameters;
+    AbstractContentModel *m_model;
+    const int m_contentType;
+};
+
+AbstractContentModel::AbstractContentModel(int contentType, QObject *parent)
+    : QAbstractListModel(parent)
+    , m_currentContent(&m_content)
+    , m_contentType(contentType)
+{
+}
+
+AbstractContentModel::~AbstractContentModel()
+{
+    QMutexLocker locker(&s_queryMutex);
+    if (m_queryRunner)
+        m_queryRunner->m_model = nullptr;
+    // A request still queued is left as it is.
+}
+
+void AbstractContentModel::query(QueryAgent::Parameters *parameters)
+{
+    if (m_queuedQuery) {
+        delete m_queuedQuery;
+        m_queuedQuery = parameters;
+        return;
+    }
+    m_queuedQuery = parameters;
+    if (m_status == Querying)
+        return; // the query in flight starts this one when it ends
+    m_status = Querying;
+    m_pendingStatus = Querying;
+    m_queryRequested = true;
+    postUpdate();
+}
+
+void AbstractContentModel::classBegin()
+{
+}
+
+void AbstractContentModel::componentComplete()
+{
+    m_complete = true;
+    if (m_queryRequested) {
+        m_queryRequested = false;
+        startQuery();
+    }
+}
+
+bool AbstractContentModel::acceptContent(const Content &) const
+{
+    return false;
+}
+
+void AbstractContentModel::startQuery()
+{
+    if (!m_queuedQuery) {
+        m_pendingStatus = Null;
+        return;
+    }
+    QMutexLocker locker(&s_queryMutex);
+    m_queryRunner = new QueryRunner(m_contentType, this, m_queuedQuery);
+    m_queuedQuery = nullptr;
+    QThreadPool::globalInstance()->start(m_queryRunner, 0);
+}
+
+void AbstractContentModel::postUpdate()
+{
+    if (m_updatePosted)
+        return;
+    m_updatePosted = true;
+    QCoreApplication::postEvent(this, new QEvent(QEvent::UpdateRequest));
+}
+
+bool AbstractContentModel::event(QEvent *event)
+{
+    switch (int(event->type())) {
+    case ContentEvent::s_type: {
+        const QVector<Content> &content = static_cast<ContentEvent *>(event)->content;
+        if (!content.isEmpty()) {
+            m_receivedContent += content;
+            m_contentReceived = true;
+            postUpdate();
+        }
+        return true;
+    }
+    case QueryCompleteEvent::s_type:
+        m_pendingStatus = static_cast<QueryCompleteEvent *>(event)->ok ? Finished : Error;
+        postUpdate();
+        return true;
+    case QEvent::UpdateRequest:
+        update();
+        return true;
+    default:
+        return QAbstractListModel::event(event);
+    }
+}
+
+void AbstractContentModel::update()
+{
+    for (;;) {
+        // While filtering, the full list changes silently and the filter brings the view along.
+        const bool filtered = m_currentContent == &m_filteredContent;
+        SynchronizationInterface *agent = filtered ? static_cast<SynchronizationInterface *>(&m_content) : this;
+
+        if (m_contentReceived) {
+            m_contentReceived = false;
+            // Not emptied: it grows over the query, and m_content's cursors say how far it was merged.
+            const QVector<Content> received = m_receivedContent;
+            m_content.merge(received, agent);
+            if (filtered)
+                refilter();
+            continue;
+        }
+
+        if (m_status == m_pendingStatus) {
+            if (!m_queryRequested) {
+                m_updatePosted = false;
+                return;
+            }
+            m_queryRequested = false;
+            startQuery();
+            continue;
+        }
+
+        QVector<Content> received;
+        received.swap(m_receivedContent);
+
+        m_status = m_pendingStatus;
+        if (m_queuedQuery) {
+            m_status = Querying;
+            m_pendingStatus = Querying;
+            m_queryRequested = true;
+        }
+
+        if (m_pendingStatus != Null) {
+            m_content.finish(received, agent);
+        } else {
+            if (!m_content.isEmpty())
+                agent->removeRange(0, m_content.size());
+            m_content.resetCursors();
+        }
+        if (filtered)
+            refilter();
+        if (m_status != Querying)
+            emit statusChanged();
+    }
+}
+
+QModelIndex AbstractContentModel::index(int row, int column, const QModelIndex &parent) const
+{
+    if (parent.isValid() || row < 0 || row >= m_currentContent->size() || column != 0)
+        return QModelIndex();
+    return createIndex(row, column, m_currentContent->at(row).data());
+}
+
+int AbstractContentModel::rowCount(const QModelIndex &parent) const
+{
+    return parent.isValid() ? 0 : m_currentContent->size();
+}
+
+QVariant AbstractContentModel::data(const QModelIndex &index, int role) const
+{
+    const ContentData *data = index.isValid() ? static_cast<const ContentData *>(index.internalPointer()) : nullptr;
+    return data ? data->data(role) : QVariant();
+}
+
+Content AbstractContentModel::contentAt(int index) const
+{
+    return index >= 0 && index < m_currentContent->size() ? m_currentContent->at(index) : Content();
+}
+
+void AbstractContentModel::setContent(int index, const Content &content)
+{
+    if (index < 0 || index >= m_currentContent->size())
+        return;
+    (*m_currentContent)[index] = content;
+    const QModelIndex changed = this->index(index);
+    emit dataChanged(changed, changed);
+}
+
+int AbstractContentModel::roleFromName(const QString &name) const
+{
+    const QByteArray utf8 = name.toUtf8();
+    const QHash<int, QByteArray> roles = roleNames();
+    for (auto it = roles.cbegin(); it != roles.cend(); ++it) {
+        if (it.value() == utf8)
+            return it.key();
+    }
+    return -1;
+}
+
+Content &AbstractContentModel::detachedRow(int index)
+{
+    m_currentContent->detach();
+    Content &row = (*m_currentContent)[index];
+    // A record shared with another holder is cloned, so that only this row sees the edit.
+    if (row.isValid() && row.data()->ref.loadRelaxed() > 1)
+        row = Content(row.data()->clone());
+    return row;
+}
+
+void AbstractContentModel::saveAttributes(const Content &row, const QVariantMap &attributes)
+{
+    // The reply is not looked at: the row keeps its value until the next query replaces it.
+    if (ThemeletInterface *interface = ThemeletInterface::instance())
+        interface->saveAttributes(m_contentType, row.data()->id, attributes);
+}
+
+bool AbstractContentModel::setData(const QModelIndex &index, const QVariant &value, int role)
+{
+    if (index.row() < 0 || index.column() < 0 || !index.model())
+        return false;
+    // Out of range or an empty row: nothing to write to.
+    if (index.row() >= m_currentContent->size() || !m_currentContent->at(index.row()).isValid())
+        return false;
+    Content &row = detachedRow(index.row());
+    if (!row.data()->setData(role, value))
+        return false;
+    saveAttributes(row, { { QString::fromUtf8(roleNames().value(role)), dbusValue(value) } });
+    const QModelIndex changed = this->index(index.row());
+    emit dataChanged(changed, changed, { role });
+    return true;
+}
+
+void AbstractContentModel::setProperty(int index, const QString &property, const QVariant &value)
+{
+    const int role = roleFromName(property);
+    if (role >= 0)
+        setData(createIndex(index, 0), value, role);
+}
+
+void AbstractContentModel::set(int index, const QJSValue &properties)
+{
+    if (index < 0 || index >= m_currentContent->size() || !m_currentContent->at(index).isValid())
+        return;
+    m_currentContent->detach();
+
+    QVariantMap changed;
+    QVector<int> roles;
+    QJSValueIterator it(properties);
+    while (it.hasNext()) {
+        it.next();
+        const QString name = it.name();
+        const int role = roleFromName(name);
+        if (role < 0)
+            continue;
+        const QVariant value = it.value().toVariant();
+        Content &row = detachedRow(index);
+        if (value.canConvert<QVariantMap>()) {
+            const QVariantMap given = value.toMap();
+            // The row keeps the merged whole; the bus gets only the keys given.
+            if (row.data()->setData(role, mergeMaps(row.data()->data(role).toMap(), given))) {
+                changed[name] = mergeMaps(changed.value(name).toMap(), given, true);
+                roles.append(role);
+            }
+        } else if (row.data()->setData(role, value)) {
+            changed[name] = dbusValue(value);
+            roles.append(role);
+        }
+    }
+    if (changed.isEmpty())
+        return;
+    saveAttributes(m_currentContent->at(index), changed);
+    const QModelIndex changedIndex = this->index(index);
+    emit dataChanged(changedIndex, changedIndex, roles);
+}
+
+void AbstractContentModel::remove(int index)
+{
+    const Content row = contentAt(index);
+    if (!row.isValid())
+        return;
+    // The row stays until the service's change notice has brought a new query.
+    if (ThemeletInterface *interface = ThemeletInterface::instance())
+        interface->remove(m_contentType, row.data()->id);
+}
+
+QJSValue AbstractContentModel::get(int index) const
+{
+    const Content row = contentAt(index);
+    QJSEngine *engine = qmlEngine(this);
+    if (!row.isValid() || !engine)
+        return QJSValue(QJSValue::UndefinedValue);
+    QJSValue object = engine->newObject();
+    const QHash<int, QByteArray> roles = roleNames();
+    for (auto it = roles.cbegin(); it != roles.cend(); ++it)
+        object.setProperty(QString::fromUtf8(it.value()), engine->toScriptValue(row.data()->data(it.key())));
+    return object;
+}
+
+int AbstractContentModel::indexOf(const QString &property, const QVariant &value) const
+{
+    const int role = roleFromName(property);
+    if (role < 0)
+        return -1;
+    for (int i = 0; i < m_currentContent->size(); ++i) {
+        const Content &row = m_currentContent->at(i);
+        if (row.isValid() && row.data()->data(role) == value)
+            return i;
+    }
+    return -1;
+}
+
+QVariant AbstractContentModel::dbusValue(const QVariant &value)
+{
+    switch (value.userType()) {
+    case QMetaType::QColor:
+        return value.value<QColor>().name(QColor::HexArgb);
+    case QMetaType::QUrl:
+        return value.toUrl().toString();
+    default:
+        return value;
+    }
+}
+
+QVariantMap AbstractContentModel::mergeMaps(QVariantMap base, const QVariantMap &overlay, bool convert)
+{
+    for (auto it = overlay.cbegin(); it != overlay.cend(); ++it) {
+        if (it.value().canConvert<QVariantMap>())
+            base[it.key()] = mergeMaps(base.value(it.key()).toMap(), it.value().toMap(), convert);
+        else
+            base[it.key()] = convert ? dbusValue(it.value()) : it.value();
+    }
+    return base;
+}
+
+void AbstractContentModel::insertRange(int index, int count, const QVector<Content> &source, int sourceIndex)
+{
+    if (count < 1)
+        return;
+    beginInsertRows(QModelIndex(), index, index + count - 1);
+    m_currentContent->insertRange(index, count, source, sourceIndex);
+    endInsertRows();
+    emit countChanged();
+}
+
+void AbstractContentModel::removeRange(int index, int count)
+{
+    if (count < 1)
+        return;
+    beginRemoveRows(QModelIndex(), index, index + count - 1);
+    m_currentContent->removeRange(index, count);
+    endRemoveRows();
+    emit countChanged();
+}
+
+void AbstractContentModel::updateRange(int index, int count, const QVector<Content> &source, int sourceIndex)
+{
+    // Dead during filter passes: rows that stay under a filter keep the record they had.
+    if (m_synchronizing || count < 1)
+        return;
+    m_currentContent->updateRange(index, count, source, sourceIndex);
+    emit dataChanged(this->index(index), this->index(index + count - 1));
+}
+
+void AbstractContentModel::refilter()
+{
+    if (m_currentContent != &m_filteredContent)
+        return;
+    QVector<Content> accepted;
+    accepted.reserve(m_content.size());
+    for (const Content &row : qAsConst(m_content)) {
+        if (acceptContent(row))
+            accepted.append(row);
+    }
+    m_synchronizing = true;
+    int index = 0;
+    int sourceIndex = 0;
+    SynchronizedContent::walk(m_filteredContent, accepted, index, sourceIndex, this);
+    SynchronizedContent::finish(m_filteredContent, accepted, index, sourceIndex, this);
+    m_synchronizing = false;
+}
+
+void AbstractContentModel::setFiltered(bool filtered)
+{
+    if (filtered) {
+        if (m_currentContent == &m_filteredContent)
+            return;
+        if (!m_filteredContent.isSharedWith(m_content))
+            static_cast<QVector<Content> &>(m_filteredContent) = m_content;
+        m_filteredContent.resetCursors();
+        m_currentContent = &m_filteredContent;
+        refilter();
+        return;
+    }
+    if (m_currentContent != &m_filteredContent)
+        return;
+    // A pure difference: the rows left on show read m_content's newer data once
+    // the pointer moves, without a dataChanged.
+    m_synchronizing = true;
+    int index = 0;
+    int sourceIndex = 0;
+    SynchronizedContent::walk(m_filteredContent, m_content, index, sourceIndex, this, false);
+    SynchronizedContent::finish(m_filteredContent, m_content, index, sourceIndex, this);
+    m_synchronizing = false;
+    m_currentContent = &m_content;
+}

@@ -1,0 +1,143 @@
+#include "synchronizedcontent.h"
+
+SynchronizationInterface::~SynchronizationInterface() = default;
+
+void SynchronizedContent::insertRange(int index, int count, const QVector<Content> &source, int sourceIndex)
+{
+    if (count < 1)
+        return;
+    detach();
+    for (int i = 0; i < count; ++i)
+        insert(index + i, source.at(sourceIndex + i));
+}
+
+void SynchronizedContent::removeRange(int index, int count)
+{
+    if (count < 1)
+        return;
+    detach();
+    erase(begin() + index, begin() + index + count);
+}
+
+void SynchronizedContent::updateRange(int index, int count, const QVector<Content> &source, int sourceIndex)
+{
+    if (count < 1)
+        return;
+    detach();
+    for (int i = 0; i < count; ++i)
+        (*this)[index + i] = source.at(sourceIndex + i);
+}
+
+void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationInterface *agent)
+{
+    if (m_index == size()) {
+        // Nothing old left to compare with: the rest arrives as one insertion.
+        agent->insertRange(m_index, source.size() - m_sourceIndex, source, m_sourceIndex);
+        m_index = size();
+        m_sourceIndex = source.size();
+        return;
+    }
+    walk(*this, source, m_index, m_sourceIndex, agent);
+}
+
+void SynchronizedContent::finish(const QVector<Content> &source, SynchronizationInterface *agent)
+{
+    finish(*this, source, m_index, m_sourceIndex, agent);
+}
+
+bool SynchronizedContent::walk(const QVector<Content> &list, const QVector<Content> &source, int &index,
+                               int &sourceIndex, SynchronizationInterface *agent, bool refresh)
+{
+    int run = index;
+    int runSource = sourceIndex;
+    const auto flush = [&]() {
+        if (refresh && index > run)
+            agent->updateRange(run, index - run, source, runSource);
+    };
+
+    while (index < list.size() && sourceIndex < source.size()) {
+        if (list.at(index) == source.at(sourceIndex)) {
+            ++index;
+            ++sourceIndex;
+            continue;
+        }
+        flush();
+        int matched = 0;
+        int matchedSource = 0;
+        if (!findAnchor(list, source, index, sourceIndex, agent, &matched, &matchedSource))
+            return false;
+        run = matched;
+        runSource = matchedSource;
+        index = matched + 1;
+        sourceIndex = matchedSource + 1;
+    }
+    flush();
+    return true;
+}
+
+bool SynchronizedContent::findAnchor(const QVector<Content> &list, const QVector<Content> &source, int index,
+                                     int sourceIndex, SynchronizationInterface *agent, int *matchedIndex,
+                                     int *matchedSourceIndex)
+{
+    const auto match = [&](int listIndex, int sourceMatch) {
+        *matchedIndex = listIndex;
+        *matchedSourceIndex = sourceMatch;
+        return true;
+    };
+
+    for (int k = 1;; ++k) {
+        if (index + k >= list.size()) {
+            // The old list ends within k: look for any of its remaining rows further on in the source.
+            for (int j = sourceIndex + k; j < source.size(); ++j) {
+                for (int m = 0; m < k; ++m) {
+                    if (list.at(index + m) == source.at(j)) {
+                        if (m > 0)
+                            agent->removeRange(index, m);
+                        agent->insertRange(index, j - sourceIndex, source, sourceIndex);
+                        return match(index + j - sourceIndex, j);
+                    }
+                }
+            }
+            return false;
+        }
+        if (sourceIndex + k >= source.size()) {
+            // The source ends within k: look for any of its remaining rows further on in the old list.
+            for (int i = index + k; i < list.size(); ++i) {
+                for (int m = 0; m < k; ++m) {
+                    if (source.at(sourceIndex + m) == list.at(i)) {
+                        agent->removeRange(index, i - index);
+                        if (m > 0)
+                            agent->insertRange(index, m, source, sourceIndex);
+                        return match(index + m, sourceIndex + m);
+                    }
+                }
+            }
+            return false;
+        }
+        for (int m = 0; m <= k; ++m) {
+            if (list.at(index + m) == source.at(sourceIndex + k)) {
+                if (m > 0)
+                    agent->removeRange(index, m);
+                agent->insertRange(index, k, source, sourceIndex);
+                return match(index + k, sourceIndex + k);
+            }
+            if (source.at(sourceIndex + m) == list.at(index + k)) {
+                agent->removeRange(index, k);
+                if (m > 0)
+                    agent->insertRange(index, m, source, sourceIndex);
+                return match(index + m, sourceIndex + m);
+            }
+        }
+    }
+}
+
+void SynchronizedContent::finish(const QVector<Content> &list, const QVector<Content> &source, int &index,
+                                 int &sourceIndex, SynchronizationInterface *agent)
+{
+    if (index < list.size())
+        agent->removeRange(index, list.size() - index);
+    if (sourceIndex < source.size())
+        agent->insertRange(list.size(), source.size() - sourceIndex, source, sourceIndex);
+    index = 0;
+    sourceIndex = 0;
+}

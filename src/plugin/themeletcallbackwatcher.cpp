@@ -1,0 +1,8 @@
+#include "themeletcallbackwatcher.h"
+
+ThemeletCallbackWatcher::ThemeletCallbackWatcher(const QDBusPendingCall &call, const QJSValue &callback,
+                                                 QObject *parent)
+    : QDBusPendingCallWatcher(call, parent)
+    , m_callback(callback)
+{
+}

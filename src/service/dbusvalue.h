@@ -1,0 +1,15 @@
+#ifndef DBUSVALUE_H
+#define DBUSVALUE_H
+
+#include <QVariant>
+#include <QVariantMap>
+
+// Values that arrive in an a{sv} keep their nested containers as QDBusArgument.
+// These turn them into plain QVariantMap, QVariantList and basic values at
+// every depth: maps with keys as strings, structures as lists, object paths
+// and signatures as strings, file descriptors dropped. Nesting deeper than
+// the bus allows gives an invalid value.
+QVariant plainDBusValue(const QVariant &value);
+QVariantMap plainDBusMap(const QVariantMap &map);
+
+#endif

@@ -1,0 +1,476 @@
+#include "themeletservice.h"
+
+#include "dbmanager.h"
+#include "dbusvalue.h"
+#include "filemanager.h"
+#include "installmanager.h"
+#include "profile.h"
+#include "themeletcolor.h"
+#include "themeletmanager.h"
+#include "themelettones.h"
+#include "wallpaperpalette.h"
+
+#include <QDebug>
+#include <QDir>
+#include <QFileInfo>
+#include <QSqlError>
+
+#include <cstdlib>
+
+namespace {
+
+// Bigger pictures are refused: the copy would hold the bus longer than a step.
+const qint64 MaxPictureSize = 64 * 1024 * 1024;
+const int MaxMessageLength = 300;
+
+const char *const s_fileQuery =
+        "SELECT file.permissions, themelet.fileId IS NOT NULL, themelet.homeWallpaper, "
+        "themelet.applicationWallpaper FROM file LEFT JOIN themelet ON themelet.fileId = file.id "
+        "WHERE file.id = ?;";
+
+bool isInside(const QString &path, const QString &directory)
+{
+    return QDir::cleanPath(path).startsWith(QDir::cleanPath(directory) + QLatin1Char('/'));
+}
+
+bool isNumber(const QVariant &value)
+{
+    switch (value.userType()) {
+    case QMetaType::Int: case QMetaType::UInt: case QMetaType::LongLong: case QMetaType::ULongLong:
+    case QMetaType::Short: case QMetaType::UShort: case QMetaType::UChar: case QMetaType::Double:
+        return true;
+    default:
+        return false;
+    }
+}
+
+bool isFlag(const QVariant &value)
+{
+    return value.userType() == QMetaType::Bool || (isNumber(value) && value.userType() != QMetaType::Double);
+}
+
+// A value of the profile "themelet", or a null array when neither it nor the defaults have one.
+QByteArray profileValue(const QString &key)
+{
+    char *value = profile_get_value(ThemeletApplier::ProfileName, key.toUtf8().constData());
+    const QByteArray result = value ? QByteArray(value) : QByteArray();
+    std::free(value);
+    return result;
+}
+
+}
+
+const char *const ThemeletService::ServiceName = "com.vorka.themeletd";
+const char *const ThemeletService::ObjectPath = "/com/vorka/themeletd";
+
+ThemeletService::ThemeletService(QObject *parent)
+    : QObject(parent)
+{
+    connect(&m_notifier, &ChangeNotifier::contentChanged, this, &ThemeletService::contentChanged);
+}
+
+ThemeletService::~ThemeletService() = default;
+
+ThemeletManager *ThemeletService::themeletManager()
+{
+    return static_cast<ThemeletManager *>(ContentManager::managerFromType(ThemeletContent::Themelet));
+}
+
+InstallManager *ThemeletService::installManager()
+{
+    return static_cast<InstallManager *>(ContentManager::managerFromType(6));
+}
+
+void ThemeletService::start(const QStringList &watchedDirectories)
+{
+    // The file manager's constructor opens the index and queues every known root.
+    FileManager *files = FileManager::instance();
+    InstallManager *installer = installManager();
+    ThemeletManager *themelets = themeletManager();
+    if (!files || !installer || !themelets) {
+        qCritical("themeletd: the content managers could not be made");
+        return;
+    }
+    m_fileQuery = QSqlQuery(DbManager::instance());
+    if (!m_fileQuery.prepare(QLatin1String(s_fileQuery)))
+        qWarning() << "Failed to prepare m_fileQuery." << m_fileQuery.lastError();
+    connect(themelets, &ThemeletManager::activeThemeletUpdated, this, &ThemeletService::applyThemelet);
+
+    for (const QString &path : InstallManager::installPaths())
+        installer->appendDirectory(path);
+    for (const QString &path : watchedDirectories) {
+        if (files->appendDirectory(QDir::cleanPath(QDir::current().absoluteFilePath(path)),
+                                   FileManager::UserScope, FileManager::ScanNew) == 0)
+            qWarning().noquote() << "themeletd: cannot watch" << path;
+        else
+            qDebug().noquote() << "themeletd: watching" << path;
+    }
+    m_started = true;
+}
+
+void ThemeletService::stop()
+{
+    if (!m_started)
+        return;
+    m_started = false;
+    m_fileQuery = QSqlQuery();
+    QSqlDatabase &database = DbManager::instance();
+    {
+        QSqlQuery checkpoint(database);
+        if (!checkpoint.exec(QStringLiteral("PRAGMA wal_checkpoint(TRUNCATE);")))
+            qWarning() << "themeletd: checkpoint failed:" << checkpoint.lastError();
+    }
+    database.close();
+}
+
+bool ThemeletService::fail(Error error, const QString &message)
+{
+    static const char *const names[] = { "InvalidArgs", "NotFound", "ReadOnly", "Failed" };
+    QString line = message.left(MaxMessageLength);
+    for (QChar &c : line) {
+        if (c.category() == QChar::Other_Control)
+            c = QLatin1Char(' ');
+    }
+    const QString name = QLatin1String("com.vorka.themeletd.Error.") + QLatin1String(names[error]);
+    qWarning().noquote() << name << line;
+    if (calledFromDBus())
+        sendErrorReply(name, line);
+    return false;
+}
+
+QString ThemeletService::localPath(const QString &url, const char *what)
+{
+    QString path;
+    if (url.startsWith(QLatin1Char('/'))) {
+        path = url;
+    } else {
+        // Clients send QUrl::toString(), which leaves spaces as they are.
+        const QUrl parsed(url);
+        if (parsed.isValid() && parsed.isLocalFile()
+            && (parsed.host().isEmpty() || parsed.host() == QLatin1String("localhost")))
+            path = parsed.toLocalFile();
+    }
+    if (!path.startsWith(QLatin1Char('/')) || path.contains(QChar(0))) {
+        fail(InvalidArgs, QStringLiteral("The %1 is not a local file: '%2'").arg(QLatin1String(what), url));
+        return QString();
+    }
+    return QDir::cleanPath(path);
+}
+
+ContentManager *ThemeletService::writableManager(int contentType)
+{
+    switch (contentType) {
+    case ThemeletContent::File:
+    case ThemeletContent::Themelet:
+    case ThemeletContent::Photo:
+    case ThemeletContent::Download:
+        if (ContentManager *manager = ContentManager::managerFromType(contentType))
+            return manager;
+        break;
+    default:
+        break;
+    }
+    fail(InvalidArgs, QStringLiteral("Unknown content type %1").arg(contentType));
+    return nullptr;
+}
+
+bool ThemeletService::findContent(int contentType, qint64 id, FileRow *row)
+{
+    m_fileQuery.bindValue(0, id);
+    if (!m_fileQuery.exec()) {
+        qWarning() << "Failed to execute m_fileQuery" << m_fileQuery.lastError();
+        return fail(Failed, QStringLiteral("The index could not be read"));
+    }
+    if (m_fileQuery.next()) {
+        row->found = true;
+        row->permissions = m_fileQuery.value(0).toInt();
+        row->themelet = m_fileQuery.value(1).toBool();
+        for (int column : { 2, 3 }) {
+            const QString picture = m_fileQuery.value(column).toString();
+            if (!picture.isEmpty())
+                row->pictures.append(picture);
+        }
+    }
+    m_fileQuery.finish();
+    if (!row->found || (contentType == ThemeletContent::Themelet && !row->themelet))
+        return fail(NotFound, QStringLiteral("No content of type %1 with id %2").arg(contentType).arg(id));
+    return true;
+}
+
+bool ThemeletService::checkThemeletValues(const QVariantMap &values)
+{
+    auto refuse = [this](const QString &key, const char *expected) {
+        return fail(InvalidArgs, QStringLiteral("'%1' must be %2").arg(key, QLatin1String(expected)));
+    };
+    for (auto it = values.constBegin(); it != values.constEnd(); ++it) {
+        const QString &key = it.key();
+        const QVariant &value = it.value();
+        if (key.endsWith(QLatin1String("Color"))) {
+            if (value.userType() != QMetaType::QString || !QColor::isValidColor(value.toString()))
+                return refuse(key, "a colour such as \"#ff336699\"");
+        } else if (key == QLatin1String("displayName")) {
+            if (value.userType() != QMetaType::QString)
+                return refuse(key, "a string");
+        } else if (key == QLatin1String("ringerVolume")) {
+            if (!isNumber(value) || value.toDouble() < 0 || value.toDouble() > 100)
+                return refuse(key, "a number from 0 to 100");
+        } else if (key == QLatin1String("favorite") || key.endsWith(QLatin1String("ToneEnabled"))) {
+            if (!isFlag(value))
+                return refuse(key, "a boolean");
+        } else if (key == QLatin1String("resources")) {
+            if (value.userType() != QMetaType::QVariantMap)
+                return refuse(key, "a map of tones");
+            const QVariantMap resources = value.toMap();
+            const QStringList tones = ThemeletTones::keys();
+            for (auto tone = resources.constBegin(); tone != resources.constEnd(); ++tone) {
+                const QVariantMap entry = tone.value().toMap();
+                // The engine can't tell an entry without a url from one that clears the tone.
+                if (!tones.contains(tone.key().chopped(qMin(4, tone.key().size())))
+                    || !tone.key().endsWith(QLatin1String("File")))
+                    return refuse(QStringLiteral("resources/") + tone.key(), "a tone such as \"ringerToneFile\"");
+                if (tone.value().userType() != QMetaType::QVariantMap
+                    || entry.value(QStringLiteral("url")).userType() != QMetaType::QString)
+                    return refuse(QStringLiteral("resources/") + tone.key(), "a map with a string \"url\"");
+            }
+        }
+    }
+    return true;
+}
+
+void ThemeletService::applyThemelet(const Themelet &themelet)
+{
+    m_applier.apply(themelet);
+}
+
+Themelet ThemeletService::activeThemelet()
+{
+    const QUrl source = m_settings.source();
+    return source.isEmpty() ? Themelet() : themeletManager()->themeletFromUrl(source);
+}
+
+QString ThemeletService::copyToWallpapers(const QString &path)
+{
+    const QString directory = ThemeletManager::wallpapersPath();
+    if (!QDir().mkpath(directory)) {
+        qWarning().noquote() << "themeletd: cannot create" << directory;
+        return QString();
+    }
+    const QFileInfo info(path);
+    const QString base = info.completeBaseName().isEmpty() ? QStringLiteral("wallpaper") : info.completeBaseName();
+    const QString suffix = info.suffix().isEmpty() ? QString() : QLatin1Char('.') + info.suffix();
+    for (int n = 1; n < 1000; ++n) {
+        const QString target = directory + QLatin1Char('/') + base
+                + (n == 1 ? QString() : QLatin1Char('-') + QString::number(n)) + suffix;
+        if (QFileInfo(target).exists() || QFileInfo(target).isSymLink())
+            continue;
+        if (QFile::copy(path, target))
+            return target;
+        qWarning().noquote() << "themeletd: cannot copy" << path << "to" << target;
+        return QString();
+    }
+    return QString();
+}
+
+qlonglong ThemeletService::createThemelet(const QString &url)
+{
+    qDebug().noquote() << "createThemelet" << url;
+    const QString path = localPath(url, "picture");
+    if (path.isEmpty())
+        return 0;
+    const QFileInfo info(path);
+    if (!info.exists())
+        return fail(NotFound, QStringLiteral("No picture at '%1'").arg(path));
+    if (!info.isFile() || !info.isReadable() || info.size() > MaxPictureSize)
+        return fail(InvalidArgs, QStringLiteral("'%1' is no readable picture file of at most 64 MiB").arg(path));
+    const WallpaperPalette palette(WallpaperPalette::readThumbnail(path));
+    if (!palette.isValid())
+        return fail(InvalidArgs, QStringLiteral("'%1' is not a picture").arg(path));
+
+    const QString copy = copyToWallpapers(path);
+    if (copy.isEmpty())
+        return fail(Failed, QStringLiteral("The picture could not be copied into %1").arg(ThemeletManager::wallpapersPath()));
+
+    ThemeletData *data = new ThemeletData(0, QUrl::fromLocalFile(copy));
+    const Themelet themelet(data);
+    data->displayName = info.completeBaseName();
+    data->homeWallpaper = copy;
+    data->applicationWallpaper = copy;
+    data->highlightColor = palette.highlightColor();
+    data->secondaryHighlightColor = palette.secondaryHighlightColor();
+    data->primaryColor = palette.primaryColor();
+    data->secondaryColor = palette.secondaryColor();
+
+    // Sounds stay as they are: those of the active themelet, else those of the profile.
+    const QStringList tones = ThemeletTones::keys();
+    QVariantMap resources;
+    const Themelet active = activeThemelet();
+    if (!active.isNull()) {
+        data->ringerVolume = active->ringerVolume;
+        data->enabledSounds = active->enabledSounds;
+        for (const QString &tone : tones) {
+            const QString key = tone + QLatin1String("File");
+            const QUrl toneUrl = active->resources.value(key).toMap().value(QStringLiteral("url")).toUrl();
+            if (toneUrl.isLocalFile())
+                resources.insert(key, QVariantMap { { QStringLiteral("url"), toneUrl.toLocalFile() } });
+        }
+    } else {
+        bool ok = false;
+        const int volume = profileValue(QLatin1String(ThemeletApplier::volumeKey())).toInt(&ok);
+        if (ok)
+            data->ringerVolume = volume;
+        const QStringList profileTones = ThemeletApplier::toneKeys(), switches = ThemeletApplier::switchKeys();
+        for (int i = 0; i < ThemeletTones::Count; ++i) {
+            const QByteArray enabled = profileValue(switches.at(i));
+            if (!enabled.isNull() && !profile_parse_bool(enabled.constData()))
+                data->enabledSounds &= ~(1 << i);
+            const QString tonePath = QString::fromUtf8(profileValue(profileTones.at(i)));
+            if (tonePath.startsWith(QLatin1Char('/')))
+                resources.insert(tones.at(i) + QLatin1String("File"), QVariantMap { { QStringLiteral("url"), tonePath } });
+        }
+    }
+
+    ThemeletManager *manager = themeletManager();
+    const qint64 id = manager->create(themelet);
+    if (id == 0) {
+        QFile::remove(copy);
+        return fail(Failed, QStringLiteral("The themelet of '%1' could not be stored").arg(path));
+    }
+    if (!resources.isEmpty() && !manager->save(id, { { QStringLiteral("resources"), resources } }))
+        qWarning() << "themeletd: the tones of themelet" << id << "could not be stored";
+    Content::signalChanged(ThemeletContent::Themelet);
+    return id;
+}
+
+void ThemeletService::indexFile(const QString &url)
+{
+    qDebug().noquote() << "indexFile" << url;
+    const QString path = localPath(url, "file");
+    if (path.isEmpty())
+        return;
+    const QFileInfo info(path);
+    if (!info.exists()) {
+        fail(NotFound, QStringLiteral("No file at '%1'").arg(path));
+        return;
+    }
+    if (!info.isFile()) {
+        fail(InvalidArgs, QStringLiteral("'%1' is not a regular file").arg(path));
+        return;
+    }
+    if (FileManager::instance()->insertFile(path) == 0) {
+        fail(Failed, QStringLiteral("'%1' could not be indexed").arg(path));
+        return;
+    }
+    Content::signalChanged(ThemeletContent::File);
+}
+
+void ThemeletService::installPackage(const QString &path)
+{
+    qDebug().noquote() << "installPackage" << path;
+    if (!path.startsWith(QLatin1Char('/')) || path.contains(QChar(0))) {
+        fail(InvalidArgs, QStringLiteral("The package path must be absolute: '%1'").arg(path));
+        return;
+    }
+    const QString directory = QDir::cleanPath(path);
+    const QFileInfo info(directory);
+    if (!info.exists()) {
+        fail(NotFound, QStringLiteral("No package at '%1'").arg(directory));
+        return;
+    }
+    if (!info.isDir()) {
+        fail(InvalidArgs, QStringLiteral("'%1' is not a directory").arg(directory));
+        return;
+    }
+    if (!installManager()->install(directory, QString(), false)) {
+        fail(Failed, QStringLiteral("The package '%1' could not be installed").arg(directory));
+        return;
+    }
+    Content::signalChanged(ThemeletContent::File);
+}
+
+void ThemeletService::refreshThemelets()
+{
+    qDebug() << "refreshThemelets";
+    // A package that changed on disk is found by scanning the install directories again.
+    InstallManager *installer = installManager();
+    for (const QString &path : InstallManager::installPaths())
+        installer->appendDirectory(path);
+    installer->refreshInstalls();
+}
+
+void ThemeletService::remove(int contentType, qlonglong contentId)
+{
+    qDebug() << "remove" << contentType << contentId;
+    ContentManager *manager = writableManager(contentType);
+    FileRow row;
+    if (!manager || !findContent(contentType, contentId, &row))
+        return;
+    if (contentType == ThemeletContent::Themelet) {
+        // Removing a themelet deletes its pictures: only those that the service made may go.
+        if (row.permissions == 1) {
+            fail(ReadOnly, QStringLiteral("Themelet %1 belongs to a package").arg(contentId));
+            return;
+        }
+        for (const QString &picture : qAsConst(row.pictures)) {
+            if (!isInside(picture, ThemeletManager::wallpapersPath())) {
+                fail(ReadOnly, QStringLiteral("Themelet %1 shows a picture that themeletd did not make; "
+                                              "delete its file instead").arg(contentId));
+                return;
+            }
+        }
+    }
+    if (!manager->remove(contentId)) {
+        fail(Failed, QStringLiteral("Content %1 of type %2 cannot be removed").arg(contentId).arg(contentType));
+        return;
+    }
+    Content::signalChanged(contentType);
+}
+
+void ThemeletService::saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
+{
+    qDebug() << "saveAttributes" << contentType << contentId << args.keys();
+    ContentManager *manager = writableManager(contentType);
+    FileRow row;
+    if (!manager || !findContent(contentType, contentId, &row))
+        return;
+    const QVariantMap values = plainDBusMap(args);
+    if (contentType == ThemeletContent::Themelet && !checkThemeletValues(values))
+        return;
+    if (!manager->save(contentId, values)) {
+        fail(Failed, QStringLiteral("Content %1 of type %2 could not be saved").arg(contentId).arg(contentType));
+        return;
+    }
+    Content::signalChanged(contentType);
+}
+
+qlonglong ThemeletService::setThemelet(const QString &url)
+{
+    qDebug().noquote() << "setThemelet" << url;
+    const QString path = localPath(url, "themelet");
+    if (path.isEmpty())
+        return 0;
+    ThemeletManager *manager = themeletManager();
+    const Themelet themelet = manager->themeletFromUrl(QUrl::fromLocalFile(path));
+    if (themelet.isNull())
+        return fail(NotFound, QStringLiteral("No themelet at '%1'").arg(path));
+
+    m_settings.setSource(QUrl::fromLocalFile(path));
+    m_settings.setHomeImagePath(themelet->homeWallpaper);
+    m_settings.setApplicationImagePath(themelet->applicationWallpaper.isEmpty() ? themelet->homeWallpaper
+                                                                                : themelet->applicationWallpaper);
+    // The store's notice comes later; an edit made before it must already find this one active.
+    manager->updateActiveThemelet();
+    applyThemelet(themelet);
+    return themelet->id;
+}
+
+bool ThemeletService::setFavorite(const QString &url, bool value)
+{
+    qDebug().noquote() << "setFavorite" << url << value;
+    const QString path = localPath(url, "wallpaper");
+    if (path.isEmpty())
+        return false;
+    if (!installManager()->setFavorite(path, value))
+        return false;
+    Content::signalChanged(ThemeletContent::Themelet);
+    return true;
+}

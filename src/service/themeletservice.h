@@ -1,0 +1,80 @@
+#ifndef THEMELETSERVICE_H
+#define THEMELETSERVICE_H
+
+#include "changenotifier.h"
+#include "content.h"
+#include "themeletapplier.h"
+#include "themeletsettings.h"
+
+#include <QDBusContext>
+#include <QObject>
+#include <QSqlQuery>
+#include <QStringList>
+#include <QVariantMap>
+
+class ContentManager;
+class InstallManager;
+class ThemeletManager;
+
+// The object behind com.vorka.themeletd: every client write reaches the engine
+// here. Input from the bus is checked before it reaches a manager, and each
+// refusal is a named error reply, "com.vorka.themeletd.Error.<Name>".
+class ThemeletService : public QObject, protected QDBusContext
+{
+    Q_OBJECT
+public:
+    static const char *const ServiceName;
+    static const char *const ObjectPath;
+
+    explicit ThemeletService(QObject *parent = nullptr);
+    ~ThemeletService() override;
+
+    // Builds the managers and queues the install directories, then the watched ones.
+    void start(const QStringList &watchedDirectories);
+    // Checkpoints the write-ahead log and closes the index.
+    void stop();
+
+public slots:
+    qlonglong createThemelet(const QString &url);
+    void indexFile(const QString &url);
+    void installPackage(const QString &path);
+    void refreshThemelets();
+    void remove(int contentType, qlonglong contentId);
+    void saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args);
+    qlonglong setThemelet(const QString &url);
+    bool setFavorite(const QString &url, bool value);
+
+signals:
+    void contentChanged(int type);
+
+private:
+    enum Error { InvalidArgs, NotFound, ReadOnly, Failed };
+
+    struct FileRow
+    {
+        bool found = false;
+        bool themelet = false;
+        int permissions = 0;
+        QStringList pictures;
+    };
+
+    bool fail(Error error, const QString &message);
+    QString localPath(const QString &url, const char *what);
+    ContentManager *writableManager(int contentType);
+    bool findContent(int contentType, qint64 id, FileRow *row);
+    bool checkThemeletValues(const QVariantMap &values);
+    void applyThemelet(const Themelet &themelet);
+    Themelet activeThemelet();
+    QString copyToWallpapers(const QString &path);
+
+    static ThemeletManager *themeletManager();
+    static InstallManager *installManager();
+
+    ChangeNotifier m_notifier;
+    ThemeletApplier m_applier;
+    ThemeletSettings m_settings;
+    QSqlQuery m_fileQuery;
+    bool m_started = false;
+};
+
+#endif
