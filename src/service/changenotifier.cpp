@@ -41,9 +41,16 @@ void ChangeNotifier::timerEvent(QTimerEvent *event)
     if (window == m_windows.end())
         return QObject::timerEvent(event);
     if (window->pending) {
-        // The timer repeats: this notice opens the next window.
-        window->pending = false;
-        emit contentChanged(window->type);
+        // This notice opens the next window, timed from now: a repeating timer
+        // keeps its phase, so after a late turn of the loop it would fire again
+        // sooner than the interval.
+        const int type = window->type;
+        killTimer(event->timerId());
+        m_windows.erase(window);
+        const int timerId = startTimer(m_interval, Qt::PreciseTimer);
+        m_timerOfType.insert(type, timerId);
+        m_windows.insert(timerId, { type, false });
+        emit contentChanged(type);
         return;
     }
     killTimer(event->timerId());
