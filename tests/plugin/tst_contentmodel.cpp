@@ -50,7 +50,7 @@ public:
     {
         static QMutex s_mutex;
         QMutexLocker locker(&s_mutex);
-        *m_trace << mimeType + (QThread::currentThread() == qApp->thread() ? " dropped" : " ran");
+        *m_trace << mimeType + (QThread::currentThread() == QCoreApplication::instance()->thread() ? " dropped" : " ran");
     }
 
 private:

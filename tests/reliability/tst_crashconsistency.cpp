@@ -116,7 +116,7 @@ class tst_CrashConsistency : public QObject
 private slots:
     void initTestCase()
     {
-        makeTree(m_watched, 12, 12);
+        makeTree(m_watched, 30, 30);
         QElapsedTimer timer;
         timer.start();
         QVERIFY(Service::start(m_service, { m_watched }, m_log));
