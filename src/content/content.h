@@ -42,7 +42,8 @@ Q_DECLARE_TYPEINFO(Content, Q_MOVABLE_TYPE);
 Q_DECLARE_METATYPE(Content)
 
 // Typed handle. Non-const access detaches by copy construction of T, so an
-// edit through a shared handle lands in a private copy.
+// edit through a shared handle lands in a private copy. A record of another
+// class gives a null handle.
 template <typename T>
 class ContentSpecialization
 {
@@ -50,7 +51,7 @@ public:
     ContentSpecialization() = default;
     explicit ContentSpecialization(T *data) : m_data(data) {}
     explicit ContentSpecialization(const Content &content)
-        : m_data(static_cast<T *>(content.data()))
+        : m_data(dynamic_cast<T *>(content.data()))
     {
     }
 

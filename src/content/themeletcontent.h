@@ -3,7 +3,8 @@
 
 namespace ThemeletContent {
 // Held as int everywhere; the numbers are part of the D-Bus and QML interfaces.
-enum Type {
+// Fixed to int so that any number from the bus, -1 included, is a value.
+enum Type : int {
     File = 0,
     Themelet = 1,
     Photo = 2,

@@ -39,6 +39,9 @@ private slots:
         for (const auto &[a, b, equal] : cases)
             QCOMPARE(QVector<bool>({ a == b, b == a, !(a != b) }), QVector<bool>(3, equal));
         QVERIFY(!null.isValid() && !null.data() && int(null.type()) == -1 && file.isValid());
+        static_assert(std::is_same_v<std::underlying_type_t<ThemeletContent::Type>, int>, "numbers from the bus are values");
+        const Content themelet(record<ThemeletData>());
+        QVERIFY(Themelet(file).isNull() && Themelet(null).isNull() && Themelet(themelet).constData() == themelet.data());
     }
 
     void roles_data()

@@ -29,6 +29,8 @@ private slots:
     void removeTakesAnInt()
     {
         QVERIFY(dynamic_cast<DownloadManager *>(ContentManager::managerFromType(4)));
+        for (int type : { 3, 5, 8, -1 })
+            QVERIFY2(!ContentManager::managerFromType(type), qPrintable(QString::number(type)));
         DownloadManager manager(DbManager::instance());
         QVERIFY(!static_cast<ContentManager &>(manager).remove(qint64(1)));
         QCOMPARE(source(), QString("http://old.example/a.jpg"));
