@@ -226,7 +226,8 @@ private slots:
         model.query(new TracedParameters("text/*", &trace));
         model.query(new TracedParameters("video/*", &trace));
         model.query(new TracedParameters("*", &trace));
-        QCOMPARE(trace, QStringList({ "text/* dropped", "video/* dropped" }));
+        // The running one may have ended meanwhile on a slow machine.
+        QCOMPARE(trace.filter(" dropped"), QStringList({ "text/* dropped", "video/* dropped" }));
         bool silent = true;
         QVERIFY(QTest::qWaitFor([&]() {
             silent = silent && (status.count() == 1) == (model.status() == AbstractContentModel::Querying);
@@ -236,7 +237,8 @@ private slots:
         QCOMPARE(status.count(), 2);
         QCOMPARE(model.status(), AbstractContentModel::Finished);
         QCOMPARE(model.count(), 301);
-        QTRY_COMPARE(trace, QStringList({ "text/* dropped", "video/* dropped", "image/* ran", "* ran" }));
+        QTRY_COMPARE(trace.size(), 4);
+        QCOMPARE(trace.filter(" ran"), QStringList({ "image/* ran", "* ran" }));
     }
 
     void failedQuery()
