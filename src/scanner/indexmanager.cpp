@@ -25,6 +25,10 @@ const char *const SelectModifiedIndex =
         "SELECT file.id, directory.id, directory.path, file.fileName FROM file LEFT JOIN directory ON file.directoryId = directory.id WHERE file.metadataCurrent = 0 AND file.mimeType = 'application/x-vorka-index' LIMIT 1;";
 const char *const UpdateDirectoryParent = "UPDATE directory SET parentId = ? WHERE id = ?";
 
+// Far beyond any pack; a larger file is cut off here and fails to parse, instead
+// of being read whole into memory.
+constexpr qint64 s_maximumSize = 16 * 1024 * 1024;
+
 }
 
 struct IndexManager::Entry

@@ -72,6 +72,9 @@ private slots:
         // A bad index leaves the rows of its directory as they are.
         add("root array", { ab, R"([{"fileName": "b.ogg"}])" }, { "a.ogg|A|x|0", "b.ogg|B|x|0" },
             { "Error parsing index from file \"%1\" , offset: 0 , errorString: \"no error occurred\"" });
+        // A file past 16 MiB is read only that far, and so fails to parse.
+        add("oversized", { ab, R"({"files": [)" + QByteArray(16 * 1024 * 1024, ' ') + "]}" }, { "a.ogg|A|x|0", "b.ogg|B|x|0" },
+            { "Error parsing index from file \"%1\" , offset: 16777216 , errorString: \"unterminated array\"" });
     }
 
     void merge()

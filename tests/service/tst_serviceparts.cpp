@@ -56,6 +56,23 @@ private slots:
         }
     }
 
+    // A loop that turns late must not bring the next signal closer than the interval.
+    void coalescingLateLoop()
+    {
+        ChangeNotifier notifier;
+        QElapsedTimer clock;
+        QList<qint64> sent;
+        connect(&notifier, &ChangeNotifier::contentChanged, [&](int) { sent.append(clock.elapsed()); });
+        clock.start();
+        notifier.notify(0);
+        notifier.notify(0);
+        QThread::msleep(140);
+        QTRY_COMPARE(sent.size(), 2);
+        notifier.notify(0);
+        QTRY_COMPARE_WITH_TIMEOUT(sent.size(), 3, 1000);
+        QVERIFY2(sent.at(2) - sent.at(1) >= 95, qPrintable(QStringLiteral("signals %1 ms apart").arg(sent.at(2) - sent.at(1))));
+    }
+
     void palette_data()
     {
         QTest::addColumn<QColor>("background");

@@ -1,0 +1,5 @@
+#include "content.h"
+
+void Content::signalChanged(int)
+{
+}
