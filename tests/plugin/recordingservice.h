@@ -39,6 +39,7 @@ public:
                                                      QStringLiteral("contentChanged")) << type);
     }
 
+    // Nested containers arrive as QDBusArgument.
     static QVariant plain(QVariant value)
     {
         if (value.userType() == qMetaTypeId<QDBusArgument>()) {
@@ -46,19 +47,15 @@ public:
             value = argument.currentType() == QDBusArgument::MapType ? QVariant(qdbus_cast<QVariantMap>(argument))
                                                                      : QVariant(qdbus_cast<QVariantList>(argument));
         }
-        if (value.userType() == QMetaType::QVariantMap) {
-            QVariantMap map = value.toMap();
-            for (QVariant &entry : map)
-                entry = plain(entry);
-            return map;
-        }
-        if (value.userType() == QMetaType::QVariantList) {
-            QVariantList list = value.toList();
-            for (QVariant &entry : list)
-                entry = plain(entry);
-            return list;
-        }
-        return value;
+        if (value.userType() != QMetaType::QVariantMap && value.userType() != QMetaType::QVariantList)
+            return value;
+        QVariantMap map = value.toMap();
+        QVariantList list = value.toList();
+        for (QVariant &entry : map)
+            entry = plain(entry);
+        for (QVariant &entry : list)
+            entry = plain(entry);
+        return value.userType() == QMetaType::QVariantMap ? QVariant(map) : QVariant(list);
     }
 
     // The calls since the last take, once `count` have come and a little longer, so that one too many shows.

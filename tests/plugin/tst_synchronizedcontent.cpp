@@ -133,17 +133,15 @@ private slots:
             };
             const QVector<Content> before = randomList();
             QVector<Content> after = seed % 4 == 0 ? randomList() : before;
-            if (seed % 4 == 1) {
+            if (seed % 4 == 1)
                 std::reverse(after.begin(), after.end());
-            } else if (seed % 4 == 2) {
-                after = before.mid(before.size() / 2) + before.mid(0, before.size() / 2);
-            } else if (seed % 4 == 3) {
-                for (int i = random.bounded(5); i > 0; --i) {
-                    if (!after.isEmpty() && random.bounded(2))
-                        after.remove(random.bounded(after.size()));
-                    else
-                        after.insert(random.bounded(after.size() + 1), make(random.bounded(ids), 0));
-                }
+            if (seed % 4 == 2) // long distances: the back half moves to the front
+                std::rotate(after.begin(), after.begin() + after.size() / 2, after.end());
+            for (int i = seed % 4 == 3 ? random.bounded(5) : 0; i > 0; --i) {
+                if (!after.isEmpty() && random.bounded(2))
+                    after.remove(random.bounded(after.size()));
+                else
+                    after.insert(random.bounded(after.size() + 1), make(random.bounded(ids), 0));
             }
             for (Content &content : after) // fresh handles: a row left unrefreshed shows
                 content = Content(content.data()->clone());
