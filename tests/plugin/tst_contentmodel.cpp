@@ -167,26 +167,14 @@ private slots:
         QCOMPARE(model.status(), AbstractContentModel::Finished);
     }
 
+    // Three requests while one runs: only the last runs, after the first, and the
+    // status stays Querying without a signal until the end.
     void queuedQueries()
     {
         addFiles(numbered(300));
         addFiles({ "picture" }, "image/jpeg");
-        s_trace.clear();
         FileModel model;
         QSignalSpy status(&model, &AbstractContentModel::statusChanged);
-
-        // Two requests before the update request arrives: the first is dropped unrun.
-        model.query(new TracedParameters("video/*"));
-        model.query(new TracedParameters("audio/*"));
-        QCOMPARE(traced(""), QStringList { "video/* dropped" });
-        QVERIFY(finished(model));
-        QCOMPARE(model.count(), 300);
-        QTRY_COMPARE(traced(" ran"), QStringList { "audio/* ran" });
-        QCOMPARE(status.count(), 1);
-
-        // Three while one runs: only the last runs, after the first, and the
-        // status stays Querying without a signal until the end.
-        s_trace.clear();
         model.query(new TracedParameters("image/*"));
         model.componentComplete(); // starts it at once
         model.query(new TracedParameters("text/*"));
@@ -196,11 +184,11 @@ private slots:
         QCOMPARE(traced(" dropped"), QStringList({ "text/* dropped", "video/* dropped" }));
         bool silent = true;
         QVERIFY(QTest::qWaitFor([&]() {
-            silent = silent && (status.count() == 1) == (model.status() == AbstractContentModel::Querying);
+            silent = silent && status.isEmpty() == (model.status() == AbstractContentModel::Querying);
             return model.status() != AbstractContentModel::Querying;
         }, 10000));
         QVERIFY(silent);
-        QCOMPARE(status.count(), 2);
+        QCOMPARE(status.count(), 1);
         QCOMPARE(model.count(), 301);
         QTRY_COMPARE(traced(" ran"), QStringList({ "image/* ran", "* ran" }));
     }
@@ -244,7 +232,6 @@ private slots:
         QQmlEngine::setContextForObject(&model, engine.rootContext());
         model.requery();
         QVERIFY(finished(model));
-        QVERIFY(model.get(1).isUndefined());
         QCOMPARE(model.indexOf("displayName", "Sea"), 0);
         QCOMPARE(model.indexOf("displayName", "Land"), -1);
 
