@@ -1,8 +1,6 @@
-// Writes the content that the QML tests list and the index of it, as the
-// service would, in another process than the client under test.
-//
-//   qmlfixture            themelets, tones and photos, then the index
-//   qmlfixture photo NAME one more photo in the watched directory
+// Writes the content that the QML tests list, and its index, as the service would,
+// in another process than the client: themelets, tones and photos, or with
+// "photo NAME" one more photo in the watched directory.
 #include "indexfixture.h"
 #include "sysroot.h"
 
