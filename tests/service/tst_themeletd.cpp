@@ -3,6 +3,7 @@
 #include "servicefixture.h"
 #include "sysroot.h"
 
+#include <QPainter>
 #include <QXmlStreamReader>
 
 #include <memory>
@@ -189,23 +190,27 @@ private slots:
 
     void createAndSet()
     {
+        // Blue beats a smaller red; a light grey one has no hue and gets dark text. The second gets a name of its own.
         QImage picture(320, 200, QImage::Format_RGB32);
         picture.fill(QColor(20, 40, 200));
-        QVERIFY(QDir().mkpath(m_sandbox + "/pictures") && picture.save(m_sandbox + "/pictures/Blue Lagoon.png"));
-        const QString url = QUrl::fromLocalFile(m_sandbox + "/pictures/Blue Lagoon.png").toString();
+        QPainter(&picture).fillRect(0, 0, 100, 100, Qt::red);
+        QVERIFY(QDir().mkpath(m_sandbox + "/pictures/grey") && picture.save(m_sandbox + "/pictures/Blue Lagoon.png"));
+        picture.fill(QColor(200, 200, 200));
+        QVERIFY(picture.save(m_sandbox + "/pictures/grey/Blue Lagoon.png"));
 
-        // Sounds come from the profile while no themelet is active; the second copy gets a name of its own.
+        // Sounds come from the profile while no themelet is active.
         QVERIFY(quiet());
-        const QDBusReply<qlonglong> first = Service::call("createThemelet", { url }), second = Service::call("createThemelet", { url });
+        const QDBusReply<qlonglong> first = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/Blue Lagoon.png").toString() }),
+                                    second = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/grey/Blue Lagoon.png").toString() });
         QVERIFY(first.isValid() && second.isValid() && first.value() > 0 && second.value() > first.value());
         const QString wallpapers = qEnvironmentVariable("XDG_DATA_HOME") + "/Vorka/themeletd/wallpapers/";
         const QString columns = "SELECT displayName, homeWallpaper, applicationWallpaper, highlightColor, secondaryHighlightColor, "
                                 "primaryColor, secondaryColor, ringerVolume, enabledSounds, (SELECT group_concat(resourceType || '=' "
                                 "|| fileName) FROM resource JOIN file ON id = resourceId WHERE fileId = %1) FROM file JOIN themelet "
                                 "ON fileId = id WHERE id = %1";
-        const QString made = "Blue Lagoon|%2|%2|#ff3344ff|#ff1f2999|#ffffffff|#a0ffffff|55|-3|ringerToneFile=bell.ogg";
-        QCOMPARE(query(columns.arg(first.value())), made.arg(wallpapers + "Blue Lagoon.png"));
-        QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png"));
+        const QString made = "Blue Lagoon|%1|%1|%2|55|-3|ringerToneFile=bell.ogg";
+        QCOMPARE(query(columns.arg(first.value())), made.arg(wallpapers + "Blue Lagoon.png", "#ff3344ff|#ff1f2999|#ffffffff|#a0ffffff"));
+        QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png", "#ffe6e6e6|#ff969696|#ff000000|#a0000000"));
         settle();
         QCOMPARE(m_signals.count(1), 2);
 
