@@ -49,13 +49,6 @@ class tst_Themeletd : public QObject
     qlonglong m_sunsetId = 0;
 
     QString query(const QString &sql) { return m_db->rows(sql).join(';'); }
-    bool waitForRows(const QString &sql, const QString &expected)
-    {
-        if (QTest::qWaitFor([&]() { return query(sql) == expected; }, 20000))
-            return true;
-        qWarning().noquote() << sql << "gives" << query(sql) << "not" << expected;
-        return false;
-    }
     // Lets the coalescing windows of the service close.
     void settle() { QTest::qWait(300); }
     // Until the service's loops have sent nothing for a while; then forgets what they sent.
@@ -98,7 +91,7 @@ private slots:
                                                       SLOT(recordChange(int))));
         QVERIFY(QTest::qWaitFor([]() { return QFile::exists(TestDatabase::indexPath()); }));
         m_db = std::make_unique<TestDatabase>();
-        QVERIFY(waitForRows("SELECT displayName FROM file JOIN themelet ON fileId = id WHERE fileName = 'sunset.themelet'", "Sunset"));
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT displayName FROM file JOIN themelet ON fileId = id WHERE fileName = 'sunset.themelet'"), QString("Sunset"), 20000);
         m_sunsetId = query("SELECT id FROM file WHERE fileName = 'sunset.themelet'").toLongLong();
     }
 
@@ -171,7 +164,7 @@ private slots:
         const QDBusMessage answer = Service::call(method, arguments);
         QCOMPARE(answer.type(), QDBusMessage::ReplyMessage);
         QCOMPARE(answer.arguments().value(0).toString(), reply);
-        QVERIFY(waitForRows(sql, rows));
+        QTRY_COMPARE_WITH_TIMEOUT(query(sql), rows, 20000);
         settle();
         QVERIFY2(m_signals.contains(type), qPrintable(QTest::toString(m_signals)));
         QVERIFY(!once || m_signals.count(type) == 1);
@@ -181,7 +174,7 @@ private slots:
     {
         QVERIFY(quiet());
         QVERIFY(writeJpeg(m_watched + "/new.jpg"));
-        QVERIFY(waitForRows("SELECT width, height FROM image JOIN file ON id = fileId WHERE fileName = 'new.jpg'", "64|48"));
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width, height FROM image JOIN file ON id = fileId WHERE fileName = 'new.jpg'"), QString("64|48"), 20000);
         settle();
         QVERIFY(m_signals.contains(2));
         // A .themelet file a user drops in gets its type from the MIME package.
@@ -315,9 +308,9 @@ private slots:
                                                                    "org.freedesktop.DBus", "ReloadConfig");
         QCOMPARE(QDBusConnection::sessionBus().call(reload).type(), QDBusMessage::ReplyMessage);
         QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
-        QVERIFY(waitForRows("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
-                                    + "') ORDER BY fileName", "later.jpg;notes.themelet"));
-        QVERIFY(waitForRows("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'", "64"));
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
+                                        + "') ORDER BY fileName"), QString("later.jpg;notes.themelet"), 20000);
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'"), QString("64"), 20000);
     }
 };
 
