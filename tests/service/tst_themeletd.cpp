@@ -80,11 +80,11 @@ private slots:
                                                       R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
         QVERIFY(writeTree(m_sandbox + "/extra", { "images/aurora.jpg" }, "x"));
         QVERIFY(write(m_sandbox + "/extra/aurora.themelet", R"({"wallpaper": "aurora.jpg", "displayName": "Aurora"})"));
-        QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell.ogg", "OggS"));
+        QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell #2.ogg", "OggS"));
         QVERIFY(write(m_watched + "/notes.themelet", "{}"));
         QVERIFY(write(Sysroot::path("/etc/themelet/profiles.ini"),
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
-                              + "/tones/bell.ogg\nsms.alert.enabled=false\n"));
+                              + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
 
         QVERIFY(Service::start(m_service, { m_watched }));
         QVERIFY(QDBusConnection::sessionBus().connect(Service::Name, Service::Path, Service::Name, "contentChanged", this,
@@ -154,7 +154,7 @@ private slots:
         QFETCH(QString, rows);
 
         if (method == "indexFile")
-            QVERIFY(QFile::copy(m_sandbox + "/tones/bell.ogg", m_sandbox + "/loose/bell.ogg"));
+            QVERIFY(QFile::copy(m_sandbox + "/tones/bell #2.ogg", m_sandbox + "/loose/bell.ogg"));
         if (method == "refreshThemelets") {
             QVERIFY(write(m_package + "/sunset.themelet", R"({"wallpaper": "sunset.jpg", "displayName": "Sunrise", )"
                                                           R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
@@ -191,7 +191,7 @@ private slots:
         picture.fill(QColor(200, 200, 200));
         QVERIFY(picture.save(m_sandbox + "/pictures/grey/Blue Lagoon.png"));
 
-        // Sounds come from the profile while no themelet is active.
+        // Sounds come from the profile while no themelet is active; a "#" in a name is no URL fragment.
         QVERIFY(quiet());
         const QDBusReply<qlonglong> first = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/Blue Lagoon.png").toString() }),
                                     second = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/grey/Blue Lagoon.png").toString() });
@@ -201,7 +201,7 @@ private slots:
                                 "primaryColor, secondaryColor, ringerVolume, enabledSounds, (SELECT group_concat(resourceType || '=' "
                                 "|| fileName) FROM resource JOIN file ON id = resourceId WHERE fileId = %1) FROM file JOIN themelet "
                                 "ON fileId = id WHERE id = %1";
-        const QString made = "Blue Lagoon|%1|%1|%2|55|-3|ringerToneFile=bell.ogg";
+        const QString made = "Blue Lagoon|%1|%1|%2|55|-3|ringerToneFile=bell #2.ogg";
         QCOMPARE(query(columns.arg(first.value())), made.arg(wallpapers + "Blue Lagoon.png", "#ff3344ff|#ff1f2999|#ffffffff|#a0ffffff"));
         QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png", "#ffe6e6e6|#ff969696|#ff000000|#a0000000"));
         settle();
@@ -217,14 +217,14 @@ private slots:
                                  profile + "ringing.alert.enabled", profile + "sms.alert.enabled", colours + "highlight_color",
                                  colours + "secondary_highlight_color", colours + "primary_color", colours + "secondary_color" };
         const auto values = [&keys]() { QStringList values; for (const QString &key : keys) values << DConfTest::read(key); return values; };
-        QCOMPARE(values(), QStringList({ quoted, quoted, quoted, "55", "'" + m_sandbox + "/tones/bell.ogg'", "true", "false",
+        QCOMPARE(values(), QStringList({ quoted, quoted, quoted, "55", "'" + m_sandbox + "/tones/bell #2.ogg'", "true", "false",
                                          "'#ff3344ff'", "'#ff1f2999'", "'#ffffffff'", "'#a0ffffff'" }));
 
         // An edit of the active themelet is applied again.
         const QVariant edit = map({ { "highlightColor", "#ff00ff00" }, { "ringerVolume", 30 }, { "messageToneEnabled", true } });
         QCOMPARE(Service::call("saveAttributes", { 1, first.value(), edit }).type(), QDBusMessage::ReplyMessage);
         QTRY_COMPARE_WITH_TIMEOUT(DConfTest::read(colours + "highlight_color"), QString("'#ff00ff00'"), 10000);
-        QCOMPARE(values().mid(3, 4), QStringList({ "30", "'" + m_sandbox + "/tones/bell.ogg'", "true", "true" }));
+        QCOMPARE(values().mid(3, 4), QStringList({ "30", "'" + m_sandbox + "/tones/bell #2.ogg'", "true", "true" }));
 
         // Removing a themelet made here takes its copy of the picture along.
         m_signals.clear();
