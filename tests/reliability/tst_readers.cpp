@@ -1,0 +1,270 @@
+// Readers under the writer: themeletd indexes a fresh tree twice, first alone,
+// then with two client processes of four threads each querying themelets,
+// files and photos in a loop through the query agents, one connection per
+// thread. Every query must succeed, every result must be one snapshot (the
+// files of a directory are committed together, so a directory is all there or
+// not at all), and the service's loop must answer as fast as without readers
+// but for CPU share: readers run at a lower priority, so a slow answer means a
+// lock, not a busy machine. THEMELET_READER_FILES sets the tree's size.
+#include "servicefixture.h"
+#include "filequeryagent.h"
+#include "photodata.h"
+#include "sysroot.h"
+#include "themeletdata.h"
+#include "themeletqueryagent.h"
+
+#include <QBuffer>
+#include <QThread>
+
+#include <unistd.h>
+
+using namespace Fixture;
+
+namespace {
+
+const int FilesPerDirectory = 100, JpegsPerDirectory = 5, Themelets = 3, ReaderThreads = 4;
+
+// Checks the batches of one query as they come, without keeping the rows.
+struct Checker : QueryAgent::Recipient
+{
+    int type, calls = 0;
+    bool closed = false;
+    QString root, problem;
+    QSet<qint64> ids;
+    QHash<QString, int> directories;
+
+    void fail(const QString &text) { if (problem.isEmpty()) problem = text; }
+    void contentQueried(const QVector<Content> &batch) override
+    {
+        ++calls;
+        if (closed || batch.size() > QueryAgent::BatchSize)
+            fail(QStringLiteral("batch of %1 after the last one or too big").arg(batch.size()));
+        closed = batch.size() < QueryAgent::BatchSize;
+        for (const Content &content : batch) {
+            const qint64 id = content.data() ? content.data()->id : 0;
+            const QString path = content.data() ? content.data()->url.toLocalFile() : QString();
+            if (id <= 0 || ids.contains(id))
+                fail(QStringLiteral("id %1 missing or twice: %2").arg(id).arg(path));
+            ids.insert(id);
+            if (type == ThemeletContent::File && path.startsWith(root))
+                ++directories[path.section('/', 0, -2)];
+            const auto *photo = dynamic_cast<const PhotoData *>(content.data());
+            if (type == ThemeletContent::Photo && (!photo || photo->mimeType != "image/jpeg" || photo->width != 64 || photo->height != 48))
+                fail("not a photo: " + path);
+            const auto *themelet = dynamic_cast<const ThemeletData *>(content.data());
+            if (type == ThemeletContent::Themelet
+                && (!themelet || themelet->resources.value("ringerToneFile").toMap().value("fileName") != "dusk.ogg"))
+                fail("themelet without its tone: " + path);
+        }
+    }
+    QString result()
+    {
+        for (auto it = directories.constBegin(); it != directories.constEnd(); ++it) {
+            if (it.value() != FilesPerDirectory)
+                fail(QStringLiteral("torn read: %1 of %2 files of %3").arg(it.value()).arg(FilesPerDirectory).arg(it.key()));
+        }
+        if (type == ThemeletContent::Themelet && ids.size() != Themelets)
+            fail(QStringLiteral("%1 themelets").arg(ids.size()));
+        return closed ? problem : QStringLiteral("no closing batch");
+    }
+};
+
+struct ReaderTotals { int queries = 0, failures = 0, slowest = 0; QStringList problems; };
+
+// A client process: four threads query until the stop file appears, then it
+// prints its totals and problems.
+int readerMain(const QString &stopFile, const QString &root)
+{
+    [[maybe_unused]] const int niceness = ::nice(10);
+    QVector<ReaderTotals> totals(ReaderThreads);
+    QVector<QThread *> threads;
+    for (int t = 0; t < ReaderThreads; ++t) {
+        threads << QThread::create([&, t]() {
+            ReaderTotals &mine = totals[t];
+            ThemeletQueryAgent::ThemeletParameters themelets;
+            FileQueryAgent::FileParameters files;
+            for (int round = 0; !QFile::exists(stopFile); ++round) {
+                const int type = (round + t) % 3; // threads start on different types
+                Checker checker;
+                checker.type = type;
+                checker.root = root + '/';
+                QElapsedTimer timer;
+                timer.start();
+                QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::Type(type));
+                const bool ok = agent && agent->query(&checker, type == ThemeletContent::Themelet
+                                        ? static_cast<const QueryAgent::Parameters &>(themelets) : files) && checker.calls;
+                mine.slowest = qMax(mine.slowest, int(timer.elapsed()));
+                ++mine.queries;
+                mine.failures += !ok;
+                const QString problem = ok ? checker.result() : QString();
+                if (!problem.isEmpty() && mine.problems.size() < 5)
+                    mine.problems << problem;
+            }
+        });
+        threads.last()->start();
+    }
+    ReaderTotals sum;
+    for (int t = 0; t < ReaderThreads; ++t) {
+        threads.at(t)->wait();
+        delete threads.at(t);
+        sum.queries += totals.at(t).queries;
+        sum.failures += totals.at(t).failures;
+        sum.slowest = qMax(sum.slowest, totals.at(t).slowest);
+        sum.problems += totals.at(t).problems;
+    }
+    QTextStream out(stdout);
+    for (const QString &problem : sum.problems)
+        out << "problem " << problem << '\n';
+    out << "totals " << sum.queries << ' ' << sum.failures << ' ' << sum.slowest << '\n';
+    return 0;
+}
+
+struct Figures { int indexMs = 0, maxMs = 0, p99Ms = 0, calls = 0; qint64 walEnd = 0, walMax = 0; };
+
+}
+
+class tst_Readers : public QObject
+{
+    Q_OBJECT
+
+    const QString m_sandbox = qEnvironmentVariable("THEMELET_SANDBOX");
+    const QString m_root = m_sandbox + "/watched";
+    const QString m_log = m_sandbox + "/themeletd.log";
+    const int m_files = qEnvironmentVariableIsSet("THEMELET_READER_FILES") ? qEnvironmentVariableIntValue("THEMELET_READER_FILES") : 5000;
+    QProcess m_service;
+
+    static QByteArray jpeg()
+    {
+        QImage image(64, 48, QImage::Format_RGB32);
+        image.fill(Qt::darkCyan);
+        QByteArray bytes;
+        QBuffer buffer(&bytes);
+        image.save(&buffer, "JPG");
+        return bytes;
+    }
+
+    // Indexes the tree from an empty index, probing the service's loop with a
+    // cheap call all along; `readers` processes query meanwhile.
+    Figures index(int readers, QStringList *readerOutput)
+    {
+        Figures figures;
+        for (const char *suffix : { "", "-wal", "-shm" })
+            QFile::remove(TestDatabase::indexPath() + suffix);
+        const QString stopFile = m_sandbox + "/stop";
+        QFile::remove(stopFile);
+        QElapsedTimer timer;
+        timer.start();
+        if (!Service::start(m_service, { m_root }, m_log) || !QTest::qWaitFor([] { return QFile::exists(TestDatabase::indexPath()); }, 30000))
+            return figures;
+        TestDatabase db;
+        const QString installed = QStringLiteral("SELECT count(*) FROM resource WHERE resourceType = 'ringerToneFile'");
+        if (!QTest::qWaitFor([&] { return db.value(installed).toInt() == Themelets; }, 60000))
+            return figures;
+
+        std::vector<std::unique_ptr<QProcess>> clients;
+        for (int i = 0; i < readers; ++i) {
+            clients.emplace_back(new QProcess);
+            clients.back()->setProcessChannelMode(QProcess::ForwardedErrorChannel);
+            clients.back()->start(QCoreApplication::applicationFilePath(), { "reader", stopFile, m_root });
+        }
+        const QString files = QStringLiteral("SELECT count(*) FROM file JOIN directory ON directoryId = directory.id WHERE path LIKE '%1/%'").arg(m_root);
+        const QString pending = QStringLiteral("SELECT count(*) FROM file WHERE metadataCurrent = 0 AND mimeType GLOB 'image/*'");
+        QVector<int> samples;
+        for (bool done = false; !done && !timer.hasExpired(1800000);) {
+            QElapsedTimer call;
+            call.start();
+            if (Service::call("Introspect", {}, 30000, "org.freedesktop.DBus.Introspectable").type() != QDBusMessage::ReplyMessage)
+                return figures;
+            samples << int(call.elapsed());
+            if (samples.size() % 20 == 0) {
+                figures.walMax = qMax(figures.walMax, QFileInfo(TestDatabase::indexPath() + "-wal").size());
+                done = db.value(files).toInt() == m_files && db.value(pending).toInt() == 0;
+            }
+            QTest::qSleep(10);
+        }
+        figures.indexMs = int(timer.elapsed());
+        figures.walEnd = QFileInfo(TestDatabase::indexPath() + "-wal").size();
+        figures.walMax = qMax(figures.walMax, figures.walEnd);
+        QFile(stopFile).open(QIODevice::WriteOnly);
+        for (auto &client : clients) {
+            const bool finished = client->waitForFinished(120000);
+            *readerOutput << QString::fromUtf8(client->readAllStandardOutput()).split('\n', Qt::SkipEmptyParts);
+            if (!finished || client->exitStatus() != QProcess::NormalExit || client->exitCode() != 0)
+                *readerOutput << QStringLiteral("problem reader hung or crashed: %1").arg(client->exitCode());
+        }
+        std::sort(samples.begin(), samples.end());
+        figures.calls = samples.size();
+        figures.maxMs = samples.isEmpty() ? 0 : samples.last();
+        figures.p99Ms = samples.isEmpty() ? 0 : samples.at(samples.size() * 99 / 100);
+        Service::stop(m_service);
+        return figures;
+    }
+
+private slots:
+    void readersUnderWriter()
+    {
+        const QByteArray picture = jpeg();
+        for (int d = 0; d < m_files / FilesPerDirectory; ++d) {
+            const QString directory = QStringLiteral("%1/g%2/d%3/").arg(m_root).arg(d / 32).arg(d);
+            for (int f = 0; f < FilesPerDirectory; ++f) {
+                const bool isJpeg = f < JpegsPerDirectory;
+                QVERIFY(write(directory + QStringLiteral("f%1.%2").arg(f).arg(isJpeg ? "jpg" : f % 2 ? "mp3" : "txt"),
+                              isJpeg ? picture : QByteArray("content")));
+            }
+        }
+        const QString package = Sysroot::path("/usr/share/themelet/pack");
+        QVERIFY(write(package + "/sounds/dusk.ogg", "x"));
+        for (int i = 0; i < Themelets; ++i) {
+            QVERIFY(write(QStringLiteral("%1/images/w%2.jpg").arg(package).arg(i), picture));
+            QVERIFY(write(QStringLiteral("%1/t%2.themelet").arg(package).arg(i),
+                          QStringLiteral(R"({"wallpaper": "w%1.jpg", "displayName": "T%1", "ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})")
+                                  .arg(i).toUtf8()));
+        }
+
+        QStringList output;
+        const Figures alone = index(0, &output);
+        QVERIFY(alone.indexMs);
+        const Figures shared = index(2, &output);
+        QVERIFY(shared.indexMs);
+
+        int queries = 0, failures = 0, slowest = 0;
+        QStringList problems;
+        for (const QString &line : output) {
+            const QStringList words = line.split(' ');
+            if (words.first() == "totals") {
+                queries += words.value(1).toInt();
+                failures += words.value(2).toInt();
+                slowest = qMax(slowest, words.value(3).toInt());
+            } else {
+                problems << line;
+            }
+        }
+        for (int run = 0; run < 2; ++run) {
+            const Figures &f = run ? shared : alone;
+            qInfo("%s readers: %d files indexed in %d ms; loop round trip max %d ms, p99 %d ms over %d calls; "
+                  "-wal max %lld KiB, at the end %lld KiB", run ? "with" : "without", m_files, f.indexMs,
+                  f.maxMs, f.p99Ms, f.calls, f.walMax / 1024, f.walEnd / 1024);
+        }
+        qInfo("readers: %d queries, %d failed, slowest %d ms", queries, failures, slowest);
+
+        QVERIFY2(problems.isEmpty(), qPrintable(problems.join('\n')));
+        QVERIFY(queries >= 2 * ReaderThreads * 3);
+        QCOMPARE(failures, 0);
+        QFile log(m_log);
+        QVERIFY(log.open(QIODevice::ReadOnly));
+        const QByteArray text = log.readAll();
+        QVERIFY2(!text.contains("QSqlError"), text.constData());
+    }
+};
+
+int main(int argc, char *argv[])
+{
+    QCoreApplication app(argc, argv);
+    if (argc == 4 && qstrcmp(argv[1], "reader") == 0)
+        return readerMain(app.arguments().at(2), app.arguments().at(3));
+    tst_Readers test;
+    QTEST_SET_MAIN_SOURCE_PATH
+    return QTest::qExec(&test, argc, argv);
+}
+
+#include "tst_readers.moc"
