@@ -236,6 +236,8 @@ private slots:
         const Figures shared = index(2, &output);
         QVERIFY(shared.indexMs);
         QVERIFY(shared.walIdle <= MaxLogSize);
+        // A writer waiting on a reader's lock would stall for the busy timeout, 5 s.
+        QVERIFY2(shared.maxMs < 4 * alone.maxMs + 2000, qPrintable(QString::number(shared.maxMs)));
 
         int queries = 0, failures = 0, slowest = 0;
         QStringList problems;
@@ -258,7 +260,7 @@ private slots:
         qInfo("readers: %d queries, %d failed, slowest %d ms", queries, failures, slowest);
 
         QVERIFY2(problems.isEmpty(), qPrintable(problems.join('\n')));
-        QVERIFY(queries >= 2 * ReaderThreads * 3);
+        QVERIFY(queries >= 2 * ReaderThreads);
         QCOMPARE(failures, 0);
         QFile log(m_log);
         QVERIFY(log.open(QIODevice::ReadOnly));

@@ -1,8 +1,10 @@
 #include "changenotifier.h"
 #include "wallpaperpalette.h"
+#include "waltrimmer.h"
 
 #include <QElapsedTimer>
 #include <QPainter>
+#include <QSqlQuery>
 #include <QtTest>
 
 class tst_ServiceParts : public QObject
@@ -114,6 +116,39 @@ private slots:
                                     palette.secondaryColor().name(QColor::HexArgb) };
         QCOMPARE(derived, colors);
         QVERIFY(!WallpaperPalette(QImage()).isValid());
+    }
+
+    // The log goes only once no reader is left on an old snapshot, and a try
+    // never waits for one.
+    void walTrimming()
+    {
+        const QString path = qEnvironmentVariable("THEMELET_SANDBOX") + "/trim.sqlite";
+        QSqlDatabase writer = QSqlDatabase::addDatabase("QSQLITE", "writer");
+        writer.setConnectOptions("QSQLITE_OPEN_URI");
+        writer.setDatabaseName(QUrl::fromLocalFile(path).toString());
+        QSqlDatabase reader = QSqlDatabase::addDatabase("QSQLITE", "reader");
+        reader.setDatabaseName(path);
+        QVERIFY(writer.open() && reader.open());
+        QSqlQuery write(writer), read(reader);
+        QVERIFY(write.exec("PRAGMA journal_mode = WAL;") && write.exec("CREATE TABLE t (x BLOB);")
+                && write.exec("INSERT INTO t VALUES (1), (2);"));
+        read.setForwardOnly(true);
+        QVERIFY(read.exec("SELECT x FROM t;") && read.next());
+        for (int i = 0; i < 8; ++i)
+            QVERIFY(write.exec("INSERT INTO t VALUES (randomblob(262144));"));
+
+        const qint64 limit = 1024 * 1024;
+        WalTrimmer trimmer(writer, limit, 60000);
+        QElapsedTimer clock;
+        clock.start();
+        QVERIFY(!trimmer.trim());
+        QVERIFY(clock.elapsed() < 1000);
+        QVERIFY(QFileInfo(path + "-wal").size() > limit);
+        read.finish();
+        QVERIFY(trimmer.trim());
+        QCOMPARE(QFileInfo(path + "-wal").size(), 0);
+        QVERIFY(write.exec("PRAGMA busy_timeout;") && write.next());
+        QCOMPARE(write.value(0).toInt(), 5000);
     }
 };
 
