@@ -172,8 +172,9 @@ class tst_Readers : public QObject
         figures.walIdle = wal;
         QFile(stopFile).open(QIODevice::WriteOnly);
         for (auto &client : clients) {
-            // A client that hung or crashed leaves no line of four numbers.
-            const bool finished = client->waitForFinished(120000) && client->exitStatus() == QProcess::NormalExit;
+            // A client that hung, crashed or failed a sanitizer leaves no line of four numbers.
+            const bool finished = client->waitForFinished(120000) && client->exitStatus() == QProcess::NormalExit
+                    && client->exitCode() == 0;
             *readerOutput << (finished ? QString::fromUtf8(client->readAllStandardOutput()).trimmed() : QString());
         }
         std::sort(samples.begin(), samples.end());
