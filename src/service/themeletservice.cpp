@@ -8,6 +8,7 @@
 #include "themeletcolor.h"
 #include "themeletmanager.h"
 #include "themelettones.h"
+#include "waltrimmer.h"
 #include "wallpaperpalette.h"
 
 #include <QDebug>
@@ -22,6 +23,8 @@ namespace {
 // Bigger pictures are refused: the copy would hold the bus longer than a step.
 const qint64 MaxPictureSize = 64 * 1024 * 1024;
 const int MaxMessageLength = 300;
+// Twice the log that automatic checkpoints keep when nobody reads.
+const qint64 MaxLogSize = 8 * 1024 * 1024;
 
 const char *const s_fileQuery =
         "SELECT file.permissions, themelet.fileId IS NOT NULL, themelet.homeWallpaper, "
@@ -108,6 +111,7 @@ void ThemeletService::start(const QStringList &watchedDirectories)
     if (!m_directoryQuery.prepare(QLatin1String(s_directoryQuery)))
         qWarning() << "Failed to prepare m_directoryQuery." << m_directoryQuery.lastError();
     connect(themelets, &ThemeletManager::activeThemeletUpdated, this, &ThemeletService::applyThemelet);
+    new WalTrimmer(DbManager::instance(), MaxLogSize, 1000, this);
 
     for (const QString &path : InstallManager::installPaths())
         installer->appendDirectory(path);

@@ -1,9 +1,11 @@
 #include "changenotifier.h"
+#include "waltrimmer.h"
 
 #include <QElapsedTimer>
+#include <QSqlQuery>
 #include <QtTest>
 
-// Coalescing of contentChanged; the service test covers the palette and single notices end to end.
+// Coalescing of contentChanged and trimming of the log; the service test covers the palette and single notices end to end.
 class tst_ServiceParts : public QObject
 {
     Q_OBJECT
@@ -50,6 +52,38 @@ private slots:
             QVERIFY(!times.isEmpty() && times.last() >= noticed[type].last());
             QVERIFY(times.size() <= (noticed[type].last() - noticed[type].first()) / 95 + 2);
         }
+    }
+    // The log goes only once no reader is left on an old snapshot, and a try
+    // never waits for one.
+    void walTrimming()
+    {
+        const QString path = qEnvironmentVariable("THEMELET_SANDBOX") + "/trim.sqlite";
+        QSqlDatabase writer = QSqlDatabase::addDatabase("QSQLITE", "writer");
+        writer.setConnectOptions("QSQLITE_OPEN_URI");
+        writer.setDatabaseName(QUrl::fromLocalFile(path).toString());
+        QSqlDatabase reader = QSqlDatabase::addDatabase("QSQLITE", "reader");
+        reader.setDatabaseName(path);
+        QVERIFY(writer.open() && reader.open());
+        QSqlQuery write(writer), read(reader);
+        QVERIFY(write.exec("PRAGMA journal_mode = WAL;") && write.exec("CREATE TABLE t (x BLOB);")
+                && write.exec("INSERT INTO t VALUES (1), (2);"));
+        read.setForwardOnly(true);
+        QVERIFY(read.exec("SELECT x FROM t;") && read.next());
+        for (int i = 0; i < 8; ++i)
+            QVERIFY(write.exec("INSERT INTO t VALUES (randomblob(262144));"));
+
+        const qint64 limit = 1024 * 1024;
+        WalTrimmer trimmer(writer, limit, 60000);
+        QElapsedTimer clock;
+        clock.start();
+        QVERIFY(!trimmer.trim());
+        QVERIFY(clock.elapsed() < 1000);
+        QVERIFY(QFileInfo(path + "-wal").size() > limit);
+        read.finish();
+        QVERIFY(trimmer.trim());
+        QCOMPARE(QFileInfo(path + "-wal").size(), 0);
+        QVERIFY(write.exec("PRAGMA busy_timeout;") && write.next());
+        QCOMPARE(write.value(0).toInt(), 5000);
     }
 };
 

@@ -1,0 +1,250 @@
+// themeletd indexes a fresh tree twice: alone, then while two client processes
+// of four threads query themelets, files and photos in a loop through the query
+// agents. Every query must succeed and be one snapshot (a directory's files are
+// committed together, so they are all there or none), and the loop must answer
+// about as fast as alone: readers run niced, so a slow answer means a lock, not
+// a busy machine. THEMELET_READER_FILES sets the tree's size (default 5,000).
+#include "servicefixture.h"
+#include "filequeryagent.h"
+#include "photodata.h"
+#include "sysroot.h"
+#include "themeletdata.h"
+#include "themeletqueryagent.h"
+
+#include <QThread>
+
+#include <cstdio>
+
+#include <unistd.h>
+
+using namespace Fixture;
+
+namespace {
+
+const int FilesPerDirectory = 100, JpegsPerDirectory = 5, Themelets = 3, ReaderThreads = 4;
+// The service trims its write-ahead log down from this size once readers let it.
+const qint64 MaxLogSize = 8 * 1024 * 1024;
+
+// Checks the batches of one query as they come, without keeping the rows.
+struct Checker : QueryAgent::Recipient
+{
+    Checker(int type, const QString &root) : type(type), root(root) {}
+    int type, calls = 0;
+    bool closed = false;
+    QString root, problem;
+    QSet<qint64> ids;
+    QHash<QString, int> directories;
+    void fail(const QString &text) { if (problem.isEmpty()) problem = text; }
+    void contentQueried(const QVector<Content> &batch) override
+    {
+        ++calls;
+        if (closed || batch.size() > QueryAgent::BatchSize)
+            fail(QStringLiteral("batch of %1 after the last one or too big").arg(batch.size()));
+        closed = batch.size() < QueryAgent::BatchSize;
+        for (const Content &content : batch) {
+            const qint64 id = content.data() ? content.data()->id : 0;
+            const QString path = content.data() ? content.data()->url.toLocalFile() : QString();
+            if (id <= 0 || ids.contains(id))
+                fail(QStringLiteral("id %1 missing or twice: %2").arg(id).arg(path));
+            ids.insert(id);
+            if (type == ThemeletContent::File && path.startsWith(root))
+                ++directories[path.section('/', 0, -2)];
+            const auto *photo = dynamic_cast<const PhotoData *>(content.data());
+            if (type == ThemeletContent::Photo && (!photo || photo->mimeType != "image/jpeg" || photo->width != 64 || photo->height != 48))
+                fail("not a photo: " + path);
+            const auto *themelet = dynamic_cast<const ThemeletData *>(content.data());
+            if (type == ThemeletContent::Themelet
+                && (!themelet || themelet->resources.value("ringerToneFile").toMap().value("fileName") != "dusk.ogg"))
+                fail("themelet without its tone: " + path);
+        }
+    }
+    QString result()
+    {
+        for (auto it = directories.constBegin(); it != directories.constEnd(); ++it) {
+            if (it.value() != FilesPerDirectory)
+                fail(QStringLiteral("torn read: %1 of %2 files of %3").arg(it.value()).arg(FilesPerDirectory).arg(it.key()));
+        }
+        if (type == ThemeletContent::Themelet && ids.size() != Themelets)
+            fail(QStringLiteral("%1 themelets").arg(ids.size()));
+        return closed ? problem : QStringLiteral("no closing batch");
+    }
+};
+
+// A client process: four threads query until the stop file appears. Prints
+// its queries, failed queries, wrong results and slowest query in ms.
+int readerMain(const QString &stopFile, const QString &root)
+{
+    [[maybe_unused]] const int niceness = ::nice(10);
+    QMutex mutex;
+    int totals[4] = {};
+    std::vector<std::unique_ptr<QThread>> threads;
+    for (int t = 0; t < ReaderThreads; ++t) {
+        threads.emplace_back(QThread::create([&, t]() {
+            int queries = 0, failures = 0, problems = 0, slowest = 0;
+            ThemeletQueryAgent::ThemeletParameters themelets;
+            FileQueryAgent::FileParameters files;
+            for (; queries < 3 || !QFile::exists(stopFile); ++queries) { // each type at least once
+                const int type = (queries + t) % 3; // threads start on different types
+                Checker checker(type, root + '/');
+                QElapsedTimer timer;
+                timer.start();
+                QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::Type(type));
+                const bool ok = agent && agent->query(&checker, type == ThemeletContent::Themelet
+                                        ? static_cast<const QueryAgent::Parameters &>(themelets) : files) && checker.calls;
+                slowest = qMax(slowest, int(timer.elapsed()));
+                failures += !ok;
+                const QString problem = ok ? checker.result() : QString();
+                if (!problem.isEmpty() && ++problems <= 5)
+                    qWarning("wrong result: %s", qPrintable(problem));
+            }
+            QMutexLocker locker(&mutex);
+            totals[0] += queries, totals[1] += failures, totals[2] += problems, totals[3] = qMax(totals[3], slowest);
+        }));
+        threads.back()->start();
+    }
+    for (auto &thread : threads)
+        thread->wait();
+    std::printf("%d %d %d %d\n", totals[0], totals[1], totals[2], totals[3]);
+    return 0;
+}
+
+struct Figures { int indexMs = 0, trimMs = 0, maxMs = 0, p99Ms = 0, calls = 0; qint64 walEnd = 0, walIdle = 0; };
+
+}
+
+class tst_Readers : public QObject
+{
+    Q_OBJECT
+
+    const QString m_sandbox = qEnvironmentVariable("THEMELET_SANDBOX");
+    const QString m_root = m_sandbox + "/watched";
+    const QString m_log = m_sandbox + "/themeletd.log";
+    const int m_files = qEnvironmentVariableIsSet("THEMELET_READER_FILES") ? qEnvironmentVariableIntValue("THEMELET_READER_FILES") : 5000;
+    QProcess m_service;
+
+    // Indexes the tree from an empty index, probing the service's loop with a
+    // cheap call all along; `readers` processes query meanwhile.
+    Figures index(int readers, QStringList *readerOutput)
+    {
+        Figures figures;
+        for (const char *suffix : { "", "-wal", "-shm" })
+            QFile::remove(TestDatabase::indexPath() + suffix);
+        const QString stopFile = m_sandbox + "/stop";
+        QFile::remove(stopFile);
+        QElapsedTimer timer;
+        timer.start();
+        if (!Service::start(m_service, { m_root }, m_log) || !QTest::qWaitFor([] { return QFile::exists(TestDatabase::indexPath()); }, 30000))
+            return figures;
+        TestDatabase db;
+        const QString installed = QStringLiteral("SELECT count(*) FROM resource WHERE resourceType = 'ringerToneFile'");
+        if (!QTest::qWaitFor([&] { return db.value(installed).toInt() == Themelets; }, 60000))
+            return figures;
+
+        std::vector<std::unique_ptr<QProcess>> clients;
+        for (int i = 0; i < readers; ++i) {
+            clients.emplace_back(new QProcess);
+            clients.back()->setProcessChannelMode(QProcess::ForwardedErrorChannel);
+            clients.back()->start(QCoreApplication::applicationFilePath(), { "reader", stopFile, m_root });
+        }
+        const QString files = QStringLiteral("SELECT count(*) FROM file JOIN directory ON directoryId = directory.id WHERE path LIKE '%1/%'").arg(m_root);
+        const QString pending = QStringLiteral("SELECT count(*) FROM file WHERE metadataCurrent = 0 AND mimeType GLOB 'image/*'");
+        // Probes go on after the index is done until the log has been trimmed.
+        QVector<int> samples;
+        qint64 doneAt = -1, wal = 0;
+        while (doneAt < 0 || (wal > MaxLogSize && !timer.hasExpired(doneAt + 20000))) {
+            QElapsedTimer call;
+            call.start();
+            if (timer.hasExpired(1800000)
+                || Service::call("Introspect", {}, 30000, "org.freedesktop.DBus.Introspectable").type() != QDBusMessage::ReplyMessage)
+                return figures;
+            samples << int(call.elapsed());
+            if (samples.size() % 20 == 0) {
+                wal = QFileInfo(TestDatabase::indexPath() + "-wal").size();
+                if (doneAt < 0 && db.value(files).toInt() == m_files && db.value(pending).toInt() == 0) {
+                    doneAt = timer.elapsed();
+                    figures.walEnd = wal;
+                }
+            }
+            QTest::qSleep(10);
+        }
+        figures.indexMs = int(doneAt);
+        figures.trimMs = int(timer.elapsed() - doneAt);
+        figures.walIdle = wal;
+        QFile(stopFile).open(QIODevice::WriteOnly);
+        for (auto &client : clients) {
+            // A client that hung, crashed or failed a sanitizer leaves no line of four numbers.
+            const bool finished = client->waitForFinished(120000) && client->exitStatus() == QProcess::NormalExit
+                    && client->exitCode() == 0;
+            *readerOutput << (finished ? QString::fromUtf8(client->readAllStandardOutput()).trimmed() : QString());
+        }
+        std::sort(samples.begin(), samples.end());
+        figures.calls = samples.size();
+        figures.maxMs = samples.last();
+        figures.p99Ms = samples.at(samples.size() * 99 / 100);
+        Service::stop(m_service);
+        return figures;
+    }
+
+private slots:
+    void readersUnderWriter()
+    {
+        QFile jpeg(m_sandbox + "/picture.jpg");
+        QVERIFY(writeJpeg(jpeg.fileName()) && jpeg.open(QIODevice::ReadOnly));
+        const QByteArray picture = jpeg.readAll();
+        for (int d = 0; d < m_files / FilesPerDirectory; ++d) {
+            const QString directory = QStringLiteral("%1/g%2/d%3/").arg(m_root).arg(d / 32).arg(d);
+            for (int f = 0; f < FilesPerDirectory; ++f)
+                QVERIFY(f < JpegsPerDirectory ? write(directory + QStringLiteral("f%1.jpg").arg(f), picture)
+                                              : write(directory + QStringLiteral("f%1.%2").arg(f).arg(f % 2 ? "mp3" : "txt"), "text"));
+        }
+        const QString package = Sysroot::path("/usr/share/themelet/pack");
+        QVERIFY(write(package + "/sounds/dusk.ogg", "x"));
+        const QString themelet = R"({"wallpaper": "w%1.jpg", "displayName": "T%1", "ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})";
+        for (int i = 0; i < Themelets; ++i)
+            QVERIFY(write(QStringLiteral("%1/images/w%2.jpg").arg(package).arg(i), picture)
+                    && write(QStringLiteral("%1/t%2.themelet").arg(package).arg(i), themelet.arg(i).toUtf8()));
+
+        QStringList output;
+        const Figures alone = index(0, &output);
+        QVERIFY(alone.indexMs);
+        const Figures shared = index(2, &output);
+        int totals[4] = {}, hung = 0;
+        for (const QString &line : output) {
+            const QStringList numbers = line.split(' ');
+            hung += numbers.size() != 4;
+            for (int i = 0; i < 4 && numbers.size() == 4; ++i)
+                totals[i] = i < 3 ? totals[i] + numbers.at(i).toInt() : qMax(totals[i], numbers.at(i).toInt());
+        }
+        for (int run = 0; run < 2; ++run) {
+            const Figures &f = run ? shared : alone;
+            qInfo("%s readers: %d files indexed in %d ms; loop round trip max %d ms, p99 %d ms over %d calls; "
+                  "-wal %lld KiB when done, %lld KiB %d ms later", run ? "with" : "without", m_files,
+                  f.indexMs, f.maxMs, f.p99Ms, f.calls, f.walEnd / 1024, f.walIdle / 1024, f.trimMs);
+        }
+        qInfo("readers: %d queries, %d failed, %d wrong, slowest %d ms", totals[0], totals[1], totals[2], totals[3]);
+
+        QVERIFY(shared.indexMs);
+        QVERIFY(shared.walIdle <= MaxLogSize);
+        // A writer waiting on a reader's lock would stall for the busy timeout, 5 s.
+        QVERIFY2(shared.maxMs < 4 * alone.maxMs + 2000, qPrintable(QString::number(shared.maxMs)));
+        QCOMPARE(hung, 0);
+        QVERIFY(totals[0] >= 2 * ReaderThreads * 3);
+        QCOMPARE(totals[1], 0);
+        QCOMPARE(totals[2], 0);
+        QFile log(m_log);
+        QVERIFY(log.open(QIODevice::ReadOnly));
+        QVERIFY2(!log.peek(log.size()).contains("QSqlError"), log.readAll().constData());
+    }
+};
+
+int main(int argc, char *argv[])
+{
+    QCoreApplication app(argc, argv);
+    if (argc == 4 && qstrcmp(argv[1], "reader") == 0)
+        return readerMain(app.arguments().at(2), app.arguments().at(3));
+    tst_Readers test;
+    QTEST_SET_MAIN_SOURCE_PATH
+    return QTest::qExec(&test, argc, argv);
+}
+
+#include "tst_readers.moc"
