@@ -53,6 +53,7 @@ private slots:
             QVERIFY(times.size() <= (noticed[type].last() - noticed[type].first()) / 95 + 2);
         }
     }
+
     // The log goes only once no reader is left on an old snapshot, and a try
     // never waits for one.
     void walTrimming()
