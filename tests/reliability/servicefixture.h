@@ -37,9 +37,11 @@ inline qint64 ownerPid()
     return pid.isValid() ? qint64(pid.value()) : 0;
 }
 
-// Starts themeletd watching `watched` and waits until it owns its name. Its log
-// goes to `log` (appended) if given, else to the test's stderr. A `wrapper`
-// command runs first and must exec its arguments, so that the pid stays.
+// Starts themeletd watching `watched` and waits until it owns its name and
+// answers, which it does only once its index is open: a test's connection
+// made before would race with its creation. The log goes to `log` (appended)
+// if given, else to the test's stderr. A `wrapper` command runs first and must
+// exec its arguments, so that the pid stays.
 inline bool start(QProcess &process, const QStringList &watched, const QString &log = QString(),
                   const QStringList &wrapper = {})
 {
@@ -51,7 +53,7 @@ inline bool start(QProcess &process, const QStringList &watched, const QString &
     process.setStandardOutputFile(log.isEmpty() ? QProcess::nullDevice() : log, QIODevice::Append);
     process.start(command.takeFirst(), command);
     return process.waitForStarted(10000)
-            && QTest::qWaitFor([&]() { return ownerPid() == process.processId(); }, 30000);
+            && QTest::qWaitFor([&]() { return ownerPid() == process.processId(); }, 30000) && answers();
 }
 
 inline bool stop(QProcess &process, int signal = SIGTERM)
@@ -68,21 +70,19 @@ inline bool stop(QProcess &process, int signal = SIGTERM)
 inline QSet<QString> disk(const QString &root)
 {
     QSet<QString> entries { root + "/" };
-    QDirIterator it(root, QDir::Files | QDir::Dirs | QDir::NoDotAndDotDot, QDirIterator::Subdirectories);
-    while (it.hasNext()) {
-        const QString path = it.next();
-        if (!it.fileInfo().isSymLink() || !it.fileInfo().isDir())
-            entries << (it.fileInfo().isDir() ? path + "/" : path);
+    for (QDirIterator it(root, QDir::Files | QDir::Dirs | QDir::NoDotAndDotDot, QDirIterator::Subdirectories); it.hasNext();) {
+        const QFileInfo info(it.next());
+        if (!info.isDir() || !info.isSymLink())
+            entries << info.filePath() + (info.isDir() ? "/" : "");
     }
     return entries;
 }
 
 inline QSet<QString> rows(const QString &root)
 {
-    TestDatabase db;
     const QString under = QStringLiteral(" WHERE path = '%1' OR path LIKE '%1/%'").arg(root);
-    const QStringList entries = db.rows("SELECT path || '/' || fileName FROM file JOIN directory ON directoryId = directory.id"
-                                        + under + " UNION ALL SELECT path || '/' FROM directory" + under);
+    const QStringList entries = TestDatabase().rows("SELECT path || '/' || fileName FROM file JOIN directory ON directoryId = "
+                                                    "directory.id" + under + " UNION ALL SELECT path || '/' FROM directory" + under);
     return QSet<QString>(entries.begin(), entries.end());
 }
 
@@ -96,7 +96,7 @@ inline QString difference(const QString &root)
 
 inline bool converged(const QString &root, int timeout)
 {
-    return QTest::qWaitFor([&]() { return rows(root) == disk(root); }, timeout);
+    return QTest::qWaitFor([&]() { return difference(root).isEmpty(); }, timeout);
 }
 
 }

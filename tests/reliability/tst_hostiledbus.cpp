@@ -13,33 +13,6 @@
 
 using namespace Fixture;
 
-namespace {
-
-// Path, size and time of everything under root but the service's own places.
-QStringList snapshot(const QString &root, const QStringList &places)
-{
-    QStringList entries;
-    QDirIterator it(root, QDir::AllEntries | QDir::Hidden | QDir::System | QDir::NoDotAndDotDot, QDirIterator::Subdirectories);
-    while (it.hasNext()) {
-        const QString path = it.next();
-        if (std::none_of(places.begin(), places.end(), [&](const QString &place) { return path.startsWith(place); }))
-            entries << QStringLiteral("%1|%2|%3").arg(path).arg(it.fileInfo().isDir() ? 0 : it.fileInfo().size())
-                               .arg(it.fileInfo().lastModified().toMSecsSinceEpoch());
-    }
-    entries.sort();
-    return entries;
-}
-
-QVariantMap nested(int depth, const QVariant &leaf)
-{
-    QVariant value = leaf;
-    for (int i = 0; i < depth; ++i)
-        value = QVariantMap { { QStringLiteral("resources"), value } };
-    return value.toMap();
-}
-
-}
-
 class tst_HostileDBus : public QObject
 {
     Q_OBJECT
@@ -63,10 +36,11 @@ class tst_HostileDBus : public QObject
         const bool answered = answer.type() == QDBusMessage::ReplyMessage
                 || (answer.type() == QDBusMessage::ErrorMessage && error != "org.freedesktop.DBus.Error.NoReply"
                     && error != "org.freedesktop.DBus.Error.ServiceUnknown");
+        if (answered && Service::ownerPid() == m_service.processId())
+            return;
         QString shown;
         QDebug(&shown) << method << arguments;
-        QVERIFY2(answered && Service::ownerPid() == m_service.processId(),
-                 qPrintable(shown.left(300) + ": " + error + ' ' + answer.errorMessage()));
+        QFAIL(qPrintable(shown.left(300) + ": " + error + ' ' + answer.errorMessage()));
     }
 
 private slots:
@@ -89,10 +63,27 @@ private slots:
 
     void hostileCalls()
     {
-        // The service's own places: the index and wallpapers under the data
-        // directory, dconf under the configuration directory.
-        const QStringList places { m_sandbox + "/data", m_sandbox + "/config", m_sandbox + "/cache", m_sandbox + "/runtime" };
-        const QStringList before = snapshot(m_sandbox, places);
+        // Path, size and time of everything but the service's own places: the index and
+        // wallpapers under data/, dconf under config/.
+        const QRegularExpression places("^" + QRegularExpression::escape(m_sandbox) + "/(data|config|cache|runtime)(/|$)");
+        const auto snapshot = [&]() {
+            QStringList entries;
+            for (QDirIterator it(m_sandbox, QDir::AllEntries | QDir::Hidden | QDir::System | QDir::NoDotAndDotDot,
+                                 QDirIterator::Subdirectories); it.hasNext();) {
+                const QFileInfo info(it.next());
+                if (!places.match(info.filePath()).hasMatch())
+                    entries << QStringLiteral("%1|%2|%3").arg(info.filePath()).arg(info.isDir() ? 0 : info.size())
+                                       .arg(info.lastModified().toMSecsSinceEpoch());
+            }
+            entries.sort();
+            return entries;
+        };
+        const QStringList before = snapshot();
+        const auto nested = [](int depth, QVariant value) {
+            while (depth-- > 0)
+                value = QVariantMap { { "resources", value } };
+            return value.toMap();
+        };
         const QString victim = m_sandbox + "/victim", keep = victim + "/keep.jpg", tone = victim + "/keep.ogg";
         const QStringList urls { "", "relative/a.jpg", "..", "../../etc/passwd", "/../../etc/passwd", m_watched + "/../victim/keep.jpg",
             "file://" + m_watched + "/../../victim/keep.jpg", "file:relative.jpg", "file://otherhost/etc/passwd", "http://example.com/a.jpg",
@@ -107,9 +98,7 @@ private slots:
             attack("setFavorite", { url, false });
         }
         // Unknown and known ids and types, with values that aren't what the keys want.
-        const auto resource = [](const QString &key, const QVariant &url) {
-            return QVariantMap { { "resources", QVariantMap { { key, QVariantMap { { "url", url } } } } } };
-        };
+        const auto resource = [&](const QString &key, const QVariant &url) { return nested(1, QVariantMap { { key, QVariantMap { { "url", url } } } }); };
         const QList<QVariantMap> maps { {}, { { "displayName", 5 } }, { { "displayName", QString(100000, 'n') } }, { { "ringerVolume", 1e300 } },
             { { "ringerVolume", "60" } }, { { "highlightColor", "#12" } }, { { "homeWallpaper", keep } }, { { "url", "file://" + keep } },
             { { "resources", 5 } }, resource("ringerToneFile", tone), resource("ringerToneFile", "../../keep.ogg"), resource("bogusFile", tone),
@@ -154,15 +143,12 @@ private slots:
         QVERIFY(m_calls >= 1000);
 
         // A normal client is still served, and what was written stayed in its places.
-        QDBusMessage answer = Service::call("setFavorite", { QUrl::fromLocalFile(m_package + "/images/sunset.jpg").toString(), false });
-        QCOMPARE(answer.arguments(), QVariantList { true });
-        answer = Service::call("saveAttributes", { 1, m_themelet, QVariantMap { { "displayName", "Still here" } } });
-        QCOMPARE(answer.type(), QDBusMessage::ReplyMessage);
+        QCOMPARE(Service::call("setFavorite", { "file://" + m_package + "/images/sunset.jpg", false }).arguments(), QVariantList { true });
+        Service::call("saveAttributes", { 1, m_themelet, QVariantMap { { "displayName", "Still here" } } });
         TestDatabase db;
-        QVERIFY(QTest::qWaitFor([&]() { return db.value("SELECT displayName FROM file WHERE id = " + QString::number(m_themelet))
-                                                       == "Still here"; }));
+        QVERIFY(QTest::qWaitFor([&]() { return db.value("SELECT displayName FROM file WHERE id = " + QString::number(m_themelet)) == "Still here"; }));
         QCOMPARE(db.value("PRAGMA integrity_check").toString(), QString("ok"));
-        QCOMPARE(snapshot(m_sandbox, places), before);
+        QCOMPARE(snapshot(), before);
     }
 };
 
