@@ -69,6 +69,7 @@ void Content::signalChanged(int type)
 
 int main(int argc, char **argv)
 {
+    qputenv("QT_ENABLE_REGEXP_JIT", "0"); // as themeletd does
     QCoreApplication app(argc, argv);
     if (app.arguments().size() < 2) {
         Bench::note(QStringLiteral("usage: bench_p2_metadata DIR"));

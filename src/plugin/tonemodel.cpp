@@ -1,12 +1,11 @@
 #include "tonemodel.h"
 
-#include "filequeryagent.h"
 #include "installmanager.h"
 #include "themeletinterface.h"
 
 ToneModel::ToneModel(QObject *parent)
     : ContentModel<FileData>(ThemeletContent::File, parent)
-    , m_categories({ QStringLiteral("Ringtone"), QStringLiteral("Customer"), QStringLiteral("Default") })
+    , m_categories(toneCategories())
 {
     if (ThemeletInterface *interface = ThemeletInterface::instance())
         connect(interface, &ThemeletInterface::contentChanged, this, &ToneModel::contentChanged);
@@ -24,12 +23,22 @@ void ToneModel::contentChanged(int type)
         query(parameters());
 }
 
+QStringList ToneModel::toneCategories()
+{
+    return { QStringLiteral("Ringtone"), QStringLiteral("Customer"), QStringLiteral("Default") };
+}
+
+FileQueryAgent::FileParameters ToneModel::toneParameters(const QStringList &categories)
+{
+    FileQueryAgent::FileParameters parameters;
+    parameters.mimeType = QStringLiteral("audio/*");
+    // Read anew each time: packages come and go.
+    parameters.directories = InstallManager::installPaths();
+    parameters.categories = categories;
+    return parameters;
+}
+
 QueryAgent::Parameters *ToneModel::parameters() const
 {
-    auto *parameters = new FileQueryAgent::FileParameters;
-    parameters->mimeType = QStringLiteral("audio/*");
-    // Read anew each time: packages come and go.
-    parameters->directories = InstallManager::installPaths();
-    parameters->categories = m_categories;
-    return parameters;
+    return new FileQueryAgent::FileParameters(toneParameters(m_categories));
 }

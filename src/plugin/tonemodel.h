@@ -2,6 +2,7 @@
 #define TONEMODEL_H
 
 #include "contentmodel.h"
+#include "filequeryagent.h"
 
 #include <QStringList>
 
@@ -13,6 +14,10 @@ public:
     explicit ToneModel(QObject *parent = nullptr);
 
     void componentComplete() override;
+
+    // The list's query, shared with readers outside QML (themeletctl).
+    static QStringList toneCategories();
+    static FileQueryAgent::FileParameters toneParameters(const QStringList &categories);
 
 private slots:
     void contentChanged(int type);

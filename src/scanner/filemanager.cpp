@@ -123,13 +123,6 @@ FileManager::FileManager(QueryAgentDatabase &database, QObject *parent)
     , m_directoryParentUpdate(database)
     , m_inotifyFd(int(socket()))
 {
-    // QMimeDatabase matches a few glob patterns of the MIME database ("*.[1-9]"...)
-    // through a QRegularExpression made afresh for each file name, and JIT-compiling
-    // each one costs far more than the match: a first index took about 40% more
-    // CPU time with it. Qt reads this once, at the first match in the process, which in the
-    // service comes after this point. An explicit setting is left alone.
-    if (!qEnvironmentVariableIsSet("QT_ENABLE_REGEXP_JIT"))
-        qputenv("QT_ENABLE_REGEXP_JIT", "0");
     m_timer.start();
 
     if (m_inotifyFd < 0) {

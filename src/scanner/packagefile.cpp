@@ -32,8 +32,15 @@ bool PackageFile::read(const QString &path, QByteArray *content)
     QFile file(path);
     if (!QFileInfo(path).isFile() || !file.open(QIODevice::ReadOnly))
         return false;
-    // Read one byte past the limit: the file may grow after the size was asked.
-    *content = file.size() > MaximumSize ? QByteArray() : file.read(MaximumSize + 1);
+    // Read in pieces up to one byte past the limit, since the file may grow after its size
+    // was asked; one read of the limit would allocate it whole for every small file.
+    content->clear();
+    while (file.size() <= MaximumSize && content->size() <= MaximumSize) {
+        const QByteArray piece = file.read(qMin<qint64>(64 * 1024, MaximumSize + 1 - content->size()));
+        if (piece.isEmpty())
+            break;
+        content->append(piece);
+    }
     if (file.size() > MaximumSize || content->size() > MaximumSize) {
         qWarning() << "Skipping a file of more than" << MaximumSize << "bytes" << path;
         content->clear();

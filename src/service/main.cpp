@@ -49,6 +49,12 @@ bool watchStopSignals(QCoreApplication *app)
 
 int main(int argc, char *argv[])
 {
+    // QMimeDatabase matches a few glob patterns ("*.[1-9]"...) through a QRegularExpression
+    // made afresh for each file name, and JIT-compiling each one costs far more than the
+    // match: a first index took about 40% more CPU with it. Qt reads this once, at the first
+    // match; set here, before any thread exists. An explicit setting is left alone.
+    if (!qEnvironmentVariableIsSet("QT_ENABLE_REGEXP_JIT"))
+        qputenv("QT_ENABLE_REGEXP_JIT", "0");
     QCoreApplication app(argc, argv);
     QCoreApplication::setOrganizationName(QStringLiteral("Vorka"));
     QCoreApplication::setApplicationName(QStringLiteral("themeletd"));

@@ -1,8 +1,8 @@
 #include "indexreader.h"
 
 #include "filequeryagent.h"
-#include "installmanager.h"
 #include "themeletqueryagent.h"
+#include "tonemodel.h"
 
 #include <QFile>
 #include <QSqlQuery>
@@ -16,17 +16,6 @@ public:
 
     QVector<Content> rows;
 };
-
-// The tone list: audio in the install paths, ringtones first.
-FileQueryAgent::FileParameters toneParameters()
-{
-    FileQueryAgent::FileParameters parameters;
-    parameters.mimeType = QStringLiteral("audio/*");
-    parameters.directories = InstallManager::installPaths();
-    parameters.categories = QStringList { QStringLiteral("Ringtone"), QStringLiteral("Customer"),
-                                          QStringLiteral("Default") };
-    return parameters;
-}
 
 }
 
@@ -65,7 +54,7 @@ bool IndexReader::list(List which, QVector<Content> *rows)
     switch (which) {
     case Themelets: ok = reader->query(&collector, ThemeletQueryAgent::ThemeletParameters()); break;
     case Photos: ok = reader->query(&collector, QueryAgent::Parameters()); break;
-    case Tones: ok = reader->query(&collector, toneParameters()); break;
+    case Tones: ok = reader->query(&collector, ToneModel::toneParameters(ToneModel::toneCategories())); break;
     }
     if (!ok) {
         m_error = QStringLiteral("cannot read the index at ") + databasePath();
