@@ -37,11 +37,13 @@ inline qint64 ownerPid()
     return pid.isValid() ? qint64(pid.value()) : 0;
 }
 
-// Starts themeletd watching `watched`. Its log goes to `log` (appended) if
-// given, else to the test's stderr. A `wrapper` command runs first and must
-// exec its arguments, so that the pid stays.
-inline bool launch(QProcess &process, const QStringList &watched, const QString &log = QString(),
-                   const QStringList &wrapper = {})
+// Starts themeletd watching `watched` and waits until it owns its name and
+// answers, which it does only once its index is open: a test's connection made
+// before would race with the creation of the index. The log goes to `log`
+// (appended) if given, else to the test's stderr. A `wrapper` command runs
+// first and must exec its arguments, so that the pid stays.
+inline bool start(QProcess &process, const QStringList &watched, const QString &log = QString(),
+                  const QStringList &wrapper = {})
 {
     QStringList command = wrapper;
     command << QStringLiteral(THEMELETD_BINARY) << QStringLiteral("--no-default-watch");
@@ -50,16 +52,7 @@ inline bool launch(QProcess &process, const QStringList &watched, const QString 
     process.setProcessChannelMode(log.isEmpty() ? QProcess::ForwardedErrorChannel : QProcess::MergedChannels);
     process.setStandardOutputFile(log.isEmpty() ? QProcess::nullDevice() : log, QIODevice::Append);
     process.start(command.takeFirst(), command);
-    return process.waitForStarted(10000);
-}
-
-// Launches themeletd and waits until it owns its name and answers, which it
-// does only once its index is open: a test's connection made before would
-// race with the creation of the index.
-inline bool start(QProcess &process, const QStringList &watched, const QString &log = QString(),
-                  const QStringList &wrapper = {})
-{
-    return launch(process, watched, log, wrapper)
+    return process.waitForStarted(10000)
             && QTest::qWaitFor([&]() { return ownerPid() == process.processId(); }, 30000) && answers();
 }
 
