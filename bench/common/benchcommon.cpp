@@ -11,11 +11,13 @@
 #include <QUuid>
 
 #include <cerrno>
+#include <chrono>
 #include <csignal>
 #include <cstdio>
 #include <ctime>
 #include <sys/resource.h>
 #include <sys/wait.h>
+#include <thread>
 #include <unistd.h>
 
 namespace Bench {
@@ -41,16 +43,13 @@ void note(const QString &text)
 
 double now()
 {
-    timespec ts;
-    clock_gettime(CLOCK_MONOTONIC, &ts);
-    return ts.tv_sec + ts.tv_nsec / 1e9;
+    // steady_clock is CLOCK_MONOTONIC: comparable across processes.
+    return std::chrono::duration<double>(std::chrono::steady_clock::now().time_since_epoch()).count();
 }
 
 double cpuNow()
 {
-    timespec ts;
-    clock_gettime(CLOCK_PROCESS_CPUTIME_ID, &ts);
-    return ts.tv_sec + ts.tv_nsec / 1e9;
+    return double(std::clock()) / CLOCKS_PER_SEC;
 }
 
 ProcStats procStats(pid_t pid)
@@ -241,11 +240,7 @@ double timeProgram(const QString &program, const QStringList &arguments, Child *
 
 void sleepSeconds(double seconds)
 {
-    timespec ts;
-    ts.tv_sec = time_t(seconds);
-    ts.tv_nsec = long((seconds - ts.tv_sec) * 1e9);
-    while (nanosleep(&ts, &ts) < 0 && errno == EINTR) {
-    }
+    std::this_thread::sleep_for(std::chrono::duration<double>(seconds));
 }
 
 QString argValue(const QStringList &arguments, const QString &name, const QString &fallback)

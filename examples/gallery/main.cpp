@@ -200,6 +200,11 @@ int main(int argc, char *argv[])
     const QSize windowSize(dimensions.value(0).toInt(), dimensions.value(1).toInt());
     if (windowSize.width() <= 0 || windowSize.height() <= 0)
         parser.showHelp(2);
+    // At most a day, so that the milliseconds fit in an int.
+    bool timeoutValid = false;
+    const int timeoutSeconds = parser.value(timeout).toInt(&timeoutValid);
+    if (!timeoutValid || timeoutSeconds <= 0 || timeoutSeconds > 24 * 3600)
+        parser.showHelp(2);
 
     QQmlApplicationEngine engine;
     if (QDir(THEMELET_BUILD_QML_DIR).exists())
@@ -220,7 +225,7 @@ int main(int argc, char *argv[])
         options.tap = parser.isSet(tap);
         options.create = parser.isSet(create);
         options.switchSounds = parser.isSet(switchSounds);
-        options.timeoutMs = parser.value(timeout).toInt() * 1000;
+        options.timeoutMs = timeoutSeconds * 1000;
         driver = std::make_unique<Driver>(window, options);
     }
     return app.exec();

@@ -86,11 +86,6 @@ QVariant plain(const QVariant &value, int depth)
 
 }
 
-QVariant plainDBusValue(const QVariant &value)
-{
-    return plain(value, 0);
-}
-
 QVariantMap plainDBusMap(const QVariantMap &map)
 {
     QVariantMap result;

@@ -5,11 +5,10 @@
 #include <QVariantMap>
 
 // Values that arrive in an a{sv} keep their nested containers as QDBusArgument.
-// These turn them into plain QVariantMap, QVariantList and basic values at
+// This turns them into plain QVariantMap, QVariantList and basic values at
 // every depth: maps with keys as strings, structures as lists, object paths
 // and signatures as strings, file descriptors dropped. Nesting deeper than
 // the bus allows gives an invalid value.
-QVariant plainDBusValue(const QVariant &value);
 QVariantMap plainDBusMap(const QVariantMap &map);
 
 #endif

@@ -10,6 +10,7 @@
 #include <QSocketNotifier>
 #include <QStandardPaths>
 
+#include <cerrno>
 #include <csignal>
 #include <cstdio>
 #include <fcntl.h>
@@ -21,9 +22,12 @@ int s_signalPipe[2] = { -1, -1 };
 
 void onSignal(int number)
 {
+    // The interrupted code may be about to read errno.
+    const int savedErrno = errno;
     const char byte = char(number);
     // Nothing to do if the pipe is full: a stop is on its way already.
     [[maybe_unused]] const ssize_t written = write(s_signalPipe[1], &byte, 1);
+    errno = savedErrno;
 }
 
 // SIGTERM and SIGINT end the event loop, so that the index is closed cleanly.

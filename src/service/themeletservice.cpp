@@ -325,7 +325,7 @@ qlonglong ThemeletService::createThemelet(const QString &url)
             const QString key = tone + QLatin1String("File");
             const QUrl toneUrl = active->resources.value(key).toMap().value(QStringLiteral("url")).toUrl();
             if (toneUrl.isLocalFile())
-                resources.insert(key, QVariantMap { { QStringLiteral("url"), toneUrl.toLocalFile() } });
+                resources.insert(key, QVariantMap { { QStringLiteral("url"), toneUrl } });
         }
     } else {
         bool ok = false;
@@ -338,8 +338,10 @@ qlonglong ThemeletService::createThemelet(const QString &url)
             if (!enabled.isNull() && !profile_parse_bool(enabled.constData()))
                 data->enabledSounds &= ~(1 << i);
             const QString tonePath = QString::fromUtf8(profileValue(profileTones.at(i)));
+            // A url, not the path: a '#' or '%' in a file name would be read as URL syntax.
             if (tonePath.startsWith(QLatin1Char('/')))
-                resources.insert(tones.at(i) + QLatin1String("File"), QVariantMap { { QStringLiteral("url"), tonePath } });
+                resources.insert(tones.at(i) + QLatin1String("File"),
+                                 QVariantMap { { QStringLiteral("url"), QUrl::fromLocalFile(tonePath) } });
         }
     }
 

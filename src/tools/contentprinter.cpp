@@ -132,6 +132,16 @@ QString ContentPrinter::toText(const QVariant &value)
     }
 }
 
+QString ContentPrinter::oneLine(const QString &text)
+{
+    QString line = text;
+    for (QChar &c : line) {
+        if (c.category() == QChar::Other_Control)
+            c = QLatin1Char(' ');
+    }
+    return line;
+}
+
 void ContentPrinter::printJson(const QJsonValue &value, bool compact)
 {
     const QJsonDocument::JsonFormat format = compact ? QJsonDocument::Compact : QJsonDocument::Indented;
@@ -151,18 +161,25 @@ void ContentPrinter::printFields(const Fields &fields)
     for (const auto &field : fields)
         flatten(field.first, field.second, &lines);
     for (const QString &line : qAsConst(lines))
-        print(line);
+        print(oneLine(line));
 }
 
-void ContentPrinter::printTable(const QVector<QStringList> &rows)
+void ContentPrinter::printTable(const QVector<QStringList> &table)
 {
+    QVector<QStringList> rows;
+    for (const QStringList &row : table) {
+        QStringList cells;
+        for (const QString &cell : row)
+            cells.append(oneLine(cell));
+        rows.append(cells);
+    }
     QVector<int> widths;
-    for (const QStringList &row : rows) {
+    for (const QStringList &row : qAsConst(rows)) {
         widths.resize(std::max(widths.size(), row.size()));
         for (int i = 0; i < row.size(); ++i)
             widths[i] = std::max(widths.at(i), row.at(i).size());
     }
-    for (const QStringList &row : rows) {
+    for (const QStringList &row : qAsConst(rows)) {
         QString line;
         for (int i = 0; i < row.size(); ++i)
             line += i + 1 < row.size() ? row.at(i).leftJustified(widths.at(i) + 2) : row.at(i);

@@ -30,6 +30,10 @@ public:
     // A value as a user reads it: local URLs as paths, colours as #AARRGGBB.
     static QString toText(const QVariant &value);
 
+    // Control characters (new lines, escapes) as spaces: names and paths from
+    // the index are anybody's, and must neither split a row nor steer a terminal.
+    static QString oneLine(const QString &text);
+
     static void printJson(const QJsonValue &value, bool compact = false);
     // "name: value" lines, maps flattened to "name.key".
     static void printFields(const Fields &fields);

@@ -227,7 +227,7 @@ void ControlTool::printThemelet(const QString &verb, qint64 id)
         line += QStringLiteral(": ") + data->displayName + QStringLiteral(" (")
                 + data->url.toLocalFile() + QLatin1Char(')');
     }
-    ContentPrinter::print(line);
+    ContentPrinter::print(ContentPrinter::oneLine(line));
 }
 
 int ControlTool::list(const QStringList &arguments)

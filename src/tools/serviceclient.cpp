@@ -1,5 +1,6 @@
 #include "serviceclient.h"
 
+#include "contentprinter.h"
 #include "themeletinterface.h"
 
 #include <QDBusConnectionInterface>
@@ -12,12 +13,7 @@ const int MaxMessageLength = 300;
 // Text from the bus reaches a terminal: no control characters, no new lines.
 QString oneLine(const QString &text)
 {
-    QString line = text.left(MaxMessageLength);
-    for (QChar &c : line) {
-        if (c.category() == QChar::Other_Control)
-            c = QLatin1Char(' ');
-    }
-    return line.trimmed();
+    return ContentPrinter::oneLine(text.left(MaxMessageLength)).trimmed();
 }
 }
 

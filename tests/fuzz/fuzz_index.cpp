@@ -1,17 +1,13 @@
 // .index files through IndexManager::updateMetaData: parsing, aliases and the
 // merge against the rows of the described directory, which keep what earlier
 // inputs made of them.
+#include "contentmanager.h"
 #include "fuzzsupport.h"
-#include "filemanager.h"
-#include "indexmanager.h"
 
 namespace {
-
-QString s_root;
-QString s_tones;
+QString s_root, s_tones;
 ContentManager *s_manager = nullptr;
 qint64 s_indexId = 0;
-
 }
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***)
@@ -40,8 +36,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
     }
     // Rows name files that are there, by their own name.
     QSqlQuery rows(DbManager::instance());
-    rows.exec(QStringLiteral("SELECT fileName FROM file JOIN directory ON directoryId = directory.id WHERE path = '%1'")
-                      .arg(s_tones));
+    rows.exec(QStringLiteral("SELECT fileName FROM file JOIN directory ON directoryId = directory.id WHERE path = '%1'").arg(s_tones));
     while (rows.next()) {
         const QString name = rows.value(0).toString();
         if (name.isEmpty() || name.contains(QLatin1Char('/')) || !QFileInfo(s_tones + QLatin1Char('/') + name).isFile())

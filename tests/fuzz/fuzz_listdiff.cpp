@@ -13,6 +13,8 @@
 
 namespace {
 
+bool outside(int index, int count, int size) { return count >= 1 && (index < 0 || index + count > size); }
+
 // Forwards the edits to the list and checks each one first.
 class Checker : public SynchronizationInterface
 {
@@ -21,21 +23,19 @@ public:
 
     void insertRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
     {
-        if (count >= 1 && (index < 0 || index > m_list.size() || sourceIndex < 0 || sourceIndex + count > source.size()))
+        if (outside(index, count, m_list.size() + count) || outside(sourceIndex, count, source.size()))
             Fuzz::fail(QStringLiteral("insertRange out of bounds"));
         m_list.insertRange(index, count, source, sourceIndex);
     }
     void removeRange(int index, int count) override
     {
-        if (count >= 1 && (index < 0 || index + count > m_list.size()))
+        if (outside(index, count, m_list.size()))
             Fuzz::fail(QStringLiteral("removeRange out of bounds"));
         m_list.removeRange(index, count);
     }
     void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
     {
-        if (count < 1)
-            return;
-        if (index < 0 || index + count > m_list.size() || sourceIndex < 0 || sourceIndex + count > source.size())
+        if (outside(index, count, m_list.size()) || outside(sourceIndex, count, source.size()))
             Fuzz::fail(QStringLiteral("updateRange out of bounds"));
         for (int i = 0; i < count; ++i) {
             if (m_list.at(index + i) != source.at(sourceIndex + i))
@@ -48,16 +48,6 @@ private:
     SynchronizedContent &m_list;
 };
 
-Content row(uint8_t byte)
-{
-    return Content(new FileData(byte & 0x1f, QUrl()));
-}
-
-}
-
-extern "C" int LLVMFuzzerInitialize(int *, char ***)
-{
-    return 0;
 }
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
@@ -65,29 +55,23 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
     if (size < 2 || size > 4096)
         return 0;
     const size_t oldSize = qMin<size_t>(data[0], size - 2);
-    const int batch = (data[1] & 0x3f) + 1;
-    const bool pure = data[1] & 0x80;
     SynchronizedContent list;
     QVector<Content> source;
-    for (size_t i = 0; i < oldSize; ++i)
-        list.append(row(data[2 + i]));
-    for (size_t i = 2 + oldSize; i < size; ++i)
-        source.append(row(data[i]));
+    for (size_t i = 2; i < size; ++i)
+        (i < 2 + oldSize ? static_cast<QVector<Content> &>(list) : source).append(Content(new FileData(data[i] & 0x1f, QUrl())));
 
     Checker checker(list);
-    if (pure) {
-        int index = 0;
-        int sourceIndex = 0;
+    if (data[1] & 0x80) {
+        int index = 0, sourceIndex = 0;
         SynchronizedContent::walk(list, source, index, sourceIndex, &checker, false);
         SynchronizedContent::finish(list, source, index, sourceIndex, &checker);
     } else {
         QVector<Content> received;
-        for (int at = 0; at < source.size();) {
-            for (int end = qMin(at + batch, source.size()); at < end; ++at)
-                received.append(source.at(at));
+        while (received.size() < source.size()) {
+            received += source.mid(received.size(), (data[1] & 0x3f) + 1);
             list.merge(received, &checker);
             // Rows behind the cursors are settled.
-            if (list.index() > list.size() || list.sourceIndex() > received.size() || list.index() != list.sourceIndex()
+            if (list.index() > list.size() || list.index() != list.sourceIndex() || list.sourceIndex() > received.size()
                 || !std::equal(list.begin(), list.begin() + list.index(), received.begin()))
                 Fuzz::fail(QStringLiteral("rows behind the cursors differ from the source"));
         }

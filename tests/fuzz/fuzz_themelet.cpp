@@ -2,18 +2,15 @@
 // with existing rows and the write phase. The input is split at byte 0x1e into
 // up to three files of one package; only the files given are rewritten and
 // marked unread, so later inputs re-read rows that earlier ones made.
+#include "contentmanager.h"
 #include "fuzzsupport.h"
-#include "themeletmanager.h"
 
 #include <QJsonDocument>
 
 namespace {
-
-QString s_root;
-QString s_package;
-ThemeletManager *s_manager = nullptr;
+QString s_root, s_package;
+ContentManager *s_manager = nullptr;
 qint64 s_ids[3] = {};
-
 }
 
 extern "C" int LLVMFuzzerInitialize(int *, char ***)
@@ -22,8 +19,7 @@ extern "C" int LLVMFuzzerInitialize(int *, char ***)
     s_package = s_root + QStringLiteral("/pack");
     Fuzz::write(s_package + QStringLiteral("/images/w.jpg"), "jpeg");
     Fuzz::write(s_package + QStringLiteral("/sounds/a.ogg"), "ogg");
-    s_manager = static_cast<ThemeletManager *>(ContentManager::managerFromType(1));
-    if (!s_manager)
+    if (!(s_manager = ContentManager::managerFromType(1)))
         Fuzz::fail(QStringLiteral("no themelet manager"));
     Fuzz::sql(QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 2)").arg(s_package));
     for (int i = 0; i < 3; ++i) {
@@ -37,8 +33,7 @@ extern "C" int LLVMFuzzerInitialize(int *, char ***)
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
 {
-    const QList<QByteArray> parts = QByteArray::fromRawData(reinterpret_cast<const char *>(data), int(size))
-                                            .split('\x1e').mid(0, 3);
+    const QList<QByteArray> parts = QByteArray::fromRawData(reinterpret_cast<const char *>(data), int(size)).split('\x1e').mid(0, 3);
     for (int i = 0; i < parts.size(); ++i) {
         Fuzz::write(s_package + QStringLiteral("/t%1.themelet").arg(i), parts.at(i));
         Fuzz::sql(QStringLiteral("UPDATE file SET metadataCurrent = 0 WHERE id = %1").arg(s_ids[i]));

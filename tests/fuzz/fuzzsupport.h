@@ -5,7 +5,6 @@
 
 #include <QCoreApplication>
 #include <QDir>
-#include <QFile>
 #include <QFileInfo>
 #include <QSqlError>
 #include <QSqlQuery>
@@ -65,13 +64,11 @@ inline QVariant sql(const QString &statement)
 // the kinds of damage that a hostile file must never cause.
 inline void checkIndex(const QString &root)
 {
-    if (sql(QStringLiteral("SELECT count(*) FROM resource WHERE fileId NOT IN (SELECT id FROM file) "
-                           "OR resourceId NOT IN (SELECT id FROM file)")).toInt() != 0)
-        fail(QStringLiteral("resource row without its file"));
-    if (sql(QStringLiteral("SELECT count(*) FROM themelet WHERE fileId NOT IN (SELECT id FROM file)")).toInt() != 0)
-        fail(QStringLiteral("themelet row without its file"));
-    if (sql(QStringLiteral("SELECT count(*) FROM file WHERE directoryId NOT IN (SELECT id FROM directory)")).toInt() != 0)
-        fail(QStringLiteral("file row without its directory"));
+    if (sql(QStringLiteral("SELECT (SELECT count(*) FROM resource WHERE fileId NOT IN (SELECT id FROM file) "
+                           "OR resourceId NOT IN (SELECT id FROM file)) + (SELECT count(*) FROM themelet WHERE fileId NOT IN "
+                           "(SELECT id FROM file)) + (SELECT count(*) FROM file WHERE directoryId NOT IN (SELECT id FROM directory))"))
+                .toInt() != 0)
+        fail(QStringLiteral("resource, themelet or file row without what it refers to"));
     const QString outside = sql(QStringLiteral("SELECT path FROM directory WHERE substr(path, 1, %1) != '%2' LIMIT 1")
                                         .arg(root.size()).arg(root)).toString();
     if (!outside.isEmpty())

@@ -1,8 +1,6 @@
-// Writes the content that the QML tests list and the index of it, as the
-// service would, in another process than the client under test.
-//
-//   qmlfixture            themelets, tones and photos, then the index
-//   qmlfixture photo NAME one more photo in the watched directory
+// Writes the content that the QML tests list, and its index, as the service would,
+// in another process than the client: themelets, tones and photos, or with
+// "photo NAME" one more photo in the watched directory.
 #include "indexfixture.h"
 #include "sysroot.h"
 
@@ -19,19 +17,16 @@ QString pictures()
 
 bool writePhoto(const QString &name, int day)
 {
-    const QString date = QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:%1 12:00:00").arg(day, 2, 10, QLatin1Char('0'));
-    return writeJpeg(pictures() + QLatin1Char('/') + name, { date });
+    return writeJpeg(pictures() + QLatin1Char('/') + name, { QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(day) });
 }
 
 QByteArray themelet(const QString &name, int day, const QString &tone = QString())
 {
-    QString text = QStringLiteral(R"({"wallpaper": "%1.jpg", "displayName": "%2", "timestamp": "2014-05-%3T12:00:00",)"
-                                  R"( "highlightColor": "#ffcc66", "version": 2)")
-                           .arg(name.toLower(), name)
-                           .arg(day, 2, 10, QLatin1Char('0'));
-    if (!tone.isEmpty())
-        text += QStringLiteral(R"(, "ringerToneFile": {"file": "%1", "enabled": 1})").arg(tone);
-    return (text + QLatin1Char('}')).toUtf8();
+    return QStringLiteral(R"({"wallpaper": "%1.jpg", "displayName": "%2", "timestamp": "2014-05-0%3T12:00:00",)"
+                          R"( "highlightColor": "#ffcc66", "version": 2%4})")
+            .arg(name.toLower(), name, QString::number(day),
+                 tone.isEmpty() ? QString() : QStringLiteral(R"(, "ringerToneFile": {"file": "%1", "enabled": 1})").arg(tone))
+            .toUtf8();
 }
 
 bool writeContent()

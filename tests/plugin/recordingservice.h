@@ -6,97 +6,93 @@
 #include <QDBusContext>
 #include <QDBusMessage>
 #include <QDBusMetaType>
-#include <QObject>
-#include <QStringList>
-#include <QVariantMap>
+#include <QTest>
+#include <QVariantList>
+
+#include <utility>
 
 // A stand-in for themeletd on the test's private session bus, on a connection
-// of its own so that calls really cross the bus. Writes down every call.
+// of its own so that calls really cross the bus. Writes down every call as
+// [method, arguments...], nested containers made plain.
 class RecordingService : public QObject, protected QDBusContext
 {
     Q_OBJECT
     Q_CLASSINFO("D-Bus Interface", "com.vorka.themeletd")
 public:
-    struct Call
-    {
-        QString method;
-        QVariantList arguments;
-    };
-
-    RecordingService()
-        : m_connection(QDBusConnection::connectToBus(QDBusConnection::SessionBus, QStringLiteral("recording-service")))
-    {
-    }
+    RecordingService() : m_bus(QDBusConnection::connectToBus(QDBusConnection::SessionBus, QStringLiteral("recording-service"))) {}
     ~RecordingService() override
     {
-        m_connection.unregisterService(QStringLiteral("com.vorka.themeletd"));
-        m_connection.unregisterObject(QStringLiteral("/com/vorka/themeletd"));
+        m_bus.unregisterService(QStringLiteral("com.vorka.themeletd"));
+        m_bus.unregisterObject(QStringLiteral("/com/vorka/themeletd"));
         QDBusConnection::disconnectFromBus(QStringLiteral("recording-service"));
     }
 
     bool start()
     {
-        return m_connection.registerObject(QStringLiteral("/com/vorka/themeletd"), this, QDBusConnection::ExportAllSlots)
-                && m_connection.registerService(QStringLiteral("com.vorka.themeletd"));
+        return m_bus.registerObject(QStringLiteral("/com/vorka/themeletd"), this, QDBusConnection::ExportAllSlots)
+                && m_bus.registerService(QStringLiteral("com.vorka.themeletd"));
     }
 
     bool emitContentChanged(int type)
     {
-        QDBusMessage signal = QDBusMessage::createSignal(QStringLiteral("/com/vorka/themeletd"), QStringLiteral("com.vorka.themeletd"),
-                                                         QStringLiteral("contentChanged"));
-        signal << type;
-        return m_connection.send(signal);
-    }
-
-    static QVariantMap plainMap(QVariantMap map)
-    {
-        for (QVariant &entry : map)
-            entry = plain(entry);
-        return map;
+        return m_bus.send(QDBusMessage::createSignal(QStringLiteral("/com/vorka/themeletd"), QStringLiteral("com.vorka.themeletd"),
+                                                     QStringLiteral("contentChanged")) << type);
     }
 
     // Nested containers arrive as QDBusArgument.
-    static QVariant plain(const QVariant &value)
+    static QVariant plain(QVariant value)
     {
-        if (value.userType() != qMetaTypeId<QDBusArgument>())
+        if (value.userType() == qMetaTypeId<QDBusArgument>()) {
+            const QDBusArgument argument = value.value<QDBusArgument>();
+            value = argument.currentType() == QDBusArgument::MapType ? QVariant(qdbus_cast<QVariantMap>(argument))
+                                                                     : QVariant(qdbus_cast<QVariantList>(argument));
+        }
+        if (value.userType() != QMetaType::QVariantMap && value.userType() != QMetaType::QVariantList)
             return value;
-        const QDBusArgument argument = value.value<QDBusArgument>();
-        if (argument.currentType() == QDBusArgument::MapType)
-            return plainMap(qdbus_cast<QVariantMap>(argument));
-        QVariantList list = qdbus_cast<QVariantList>(argument);
+        QVariantMap map = value.toMap();
+        QVariantList list = value.toList();
+        for (QVariant &entry : map)
+            entry = plain(entry);
         for (QVariant &entry : list)
             entry = plain(entry);
-        return list;
+        return value.userType() == QMetaType::QVariantMap ? QVariant(map) : QVariant(list);
     }
 
-    QList<Call> calls;
+    // The calls since the last take, once `count` have come and a little longer, so that one too many shows.
+    QVariantList take(int count = 0)
+    {
+        if (QTest::qWaitFor([this, count]() { return calls.size() >= count; }))
+            QTest::qWait(50);
+        return std::exchange(calls, {});
+    }
+
+    QVariantList calls;
     qlonglong replyId = 0;
     QString errorMessage; // answers createThemelet and setThemelet with an error when set
 
 public slots:
-    qlonglong createThemelet(const QString &url) { return record("createThemelet", { url }); }
-    void indexFile(const QString &url) { record("indexFile", { url }); }
-    void installPackage(const QString &path) { record("installPackage", { path }); }
-    void refreshThemelets() { record("refreshThemelets", {}); }
-    void remove(int contentType, qlonglong contentId) { record("remove", { contentType, contentId }); }
+    qlonglong createThemelet(const QString &url) { return record({ "createThemelet", url }, true); }
+    void indexFile(const QString &url) { record({ "indexFile", url }); }
+    void installPackage(const QString &path) { record({ "installPackage", path }); }
+    void refreshThemelets() { record({ "refreshThemelets" }); }
+    void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }); }
     void saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
     {
-        record("saveAttributes", { contentType, contentId, plainMap(args) });
+        record({ "saveAttributes", contentType, contentId, plain(args) });
     }
-    qlonglong setThemelet(const QString &url) { return record("setThemelet", { url }); }
-    bool setFavorite(const QString &url, bool value) { return record("setFavorite", { url, value }) != 0; }
+    qlonglong setThemelet(const QString &url) { return record({ "setThemelet", url }, true); }
+    bool setFavorite(const QString &url, bool value) { return record({ "setFavorite", url, value }) != 0; }
 
 private:
-
-    qlonglong record(const QString &method, const QVariantList &arguments)
+    qlonglong record(const QVariantList &call, bool mayFail = false)
     {
-        calls.append({ method, arguments });
-        if (!errorMessage.isEmpty() && (method == QLatin1String("createThemelet") || method == QLatin1String("setThemelet")))
+        calls.append(QVariant(call));
+        if (mayFail && !errorMessage.isEmpty())
             sendErrorReply(QStringLiteral("com.vorka.themeletd.Error"), errorMessage);
         return replyId;
     }
 
-    QDBusConnection m_connection;
+    QDBusConnection m_bus;
 };
 
 #endif

@@ -92,7 +92,6 @@ private slots:
         QTest::newRow("user") << Case { 0, disk, rows, "", "/ +a|0 b|1 c|0 fresh/ k/ +k/x|0", 3 };
         QTest::newRow("install") << Case { 1, disk, rows, "", "/ b|1 c|0 k/ +k/x|0", 2 };
         QTest::newRow("package") << Case { 2, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
-        QTest::newRow("index") << Case { 3, disk, rows, "", "/ b|1 c|1 k/ +k/x|0", 2 };
         QTest::newRow("empty listing") << Case { 0, "", "a b", "", "/", 1 };
         QTest::newRow("listing ends on a match") << Case { 0, "touch a b", "a b c", "", "/ a|1 b|1", 1 };
         // The row fetched when the listing runs out stays until the next scan; the rows after it go.

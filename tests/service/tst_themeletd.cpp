@@ -1,48 +1,38 @@
+// The real themeletd on the sandbox's private bus, with the integration files of the build tree.
 #include "dconftest.h"
-#include "indexfixture.h"
+#include "servicefixture.h"
 #include "sysroot.h"
 
-#include <QDBusConnection>
-#include <QDBusConnectionInterface>
-#include <QDBusMessage>
-#include <QDBusReply>
+#include <QPainter>
 #include <QXmlStreamReader>
 
-#include <csignal>
 #include <memory>
 
 using namespace Fixture;
 
 namespace {
 
-const QString Service = QStringLiteral("com.vorka.themeletd");
-const QString Path = QStringLiteral("/com/vorka/themeletd");
-
-// The interface element of an introspection text, as one line per element with its attributes.
+// The elements of the service's interface in an introspection text, one line each with sorted attributes.
 QStringList interfaceOutline(const QString &xml)
 {
     QStringList outline;
-    QXmlStreamReader reader(xml);
     bool inside = false;
-    while (!reader.atEnd()) {
-        reader.readNext();
-        if (reader.isStartElement() && reader.name() == QLatin1String("interface"))
-            inside = reader.attributes().value("name") == Service;
-        if (!inside || !reader.isStartElement())
+    for (QXmlStreamReader reader(xml); !reader.atEnd();) {
+        if (reader.readNext() != QXmlStreamReader::StartElement)
             continue;
+        if (reader.name() == QLatin1String("interface"))
+            inside = reader.attributes().value("name") == Service::Name;
         QStringList attributes;
         for (const QXmlStreamAttribute &attribute : reader.attributes())
             attributes << attribute.name() + "=" + attribute.value();
         attributes.sort();
-        outline << reader.name() + " " + attributes.join(' ');
+        if (inside)
+            outline << reader.name() + " " + attributes.join(' ');
     }
     return outline;
 }
 
-QVariantMap map(std::initializer_list<std::pair<QString, QVariant>> entries)
-{
-    return QVariantMap(entries);
-}
+QVariant map(std::initializer_list<std::pair<QString, QVariant>> entries) { return QVariantMap(entries); }
 
 }
 
@@ -56,51 +46,9 @@ class tst_Themeletd : public QObject
     QProcess m_service;
     std::unique_ptr<TestDatabase> m_db;
     QList<int> m_signals;
-    QHash<QString, QString> m_names; // placeholders of the data rows
+    qlonglong m_sunsetId = 0;
 
-    QString expand(QString text) const
-    {
-        for (auto it = m_names.constBegin(); it != m_names.constEnd(); ++it)
-            text.replace("%" + it.key(), it.value());
-        return text;
-    }
-    QVariant expand(const QVariant &value) const
-    {
-        if (value.userType() == QMetaType::QString)
-            return expand(value.toString());
-        if (value.userType() != QMetaType::QVariantMap)
-            return value;
-        QVariantMap result;
-        const QVariantMap source = value.toMap();
-        for (auto it = source.constBegin(); it != source.constEnd(); ++it)
-            result.insert(it.key(), expand(it.value()));
-        return result;
-    }
-
-    QDBusMessage call(const QString &method, const QVariantList &arguments,
-                      const QString &interface = Service)
-    {
-        QDBusMessage message = QDBusMessage::createMethodCall(Service, Path, interface, method);
-        QVariantList expanded;
-        for (const QVariant &argument : arguments)
-            expanded << expand(argument);
-        message.setArguments(expanded);
-        return QDBusConnection::sessionBus().call(message, QDBus::Block, 20000);
-    }
-
-    QString query(const QString &sql) { return m_db->rows(expand(sql)).join(';'); }
-    bool waitForRows(const QString &sql, const QString &expected)
-    {
-        const bool ok = QTest::qWaitFor([&]() { return query(sql) == expand(expected); }, 20000);
-        if (!ok)
-            qWarning().noquote() << sql << "gives" << query(sql) << "not" << expand(expected);
-        return ok;
-    }
-    bool waitForKey(const QString &key, const QString &value)
-    {
-        return QTest::qWaitFor([&]() { return DConfTest::read(key) == expand(value); }, 10000);
-    }
-    bool nameOwned() { return QDBusConnection::sessionBus().interface()->isServiceRegistered(Service); }
+    QString query(const QString &sql) { return m_db->rows(sql).join(';'); }
     // Lets the coalescing windows of the service close.
     void settle() { QTest::qWait(300); }
     // Until the service's loops have sent nothing for a while; then forgets what they sent.
@@ -113,11 +61,6 @@ class tst_Themeletd : public QObject
         }, 20000);
         m_signals.clear();
         return ok;
-    }
-
-    QString themeletId(const QString &fileName)
-    {
-        return query(QStringLiteral("SELECT fileId FROM themelet JOIN file ON id = fileId WHERE fileName = '%1'").arg(fileName));
     }
 
 public slots:
@@ -137,45 +80,40 @@ private slots:
                                                       R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
         QVERIFY(writeTree(m_sandbox + "/extra", { "images/aurora.jpg" }, "x"));
         QVERIFY(write(m_sandbox + "/extra/aurora.themelet", R"({"wallpaper": "aurora.jpg", "displayName": "Aurora"})"));
-        QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell.ogg", "OggS"));
+        QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell #2.ogg", "OggS"));
         QVERIFY(write(m_watched + "/notes.themelet", "{}"));
         QVERIFY(write(Sysroot::path("/etc/themelet/profiles.ini"),
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
-                              + "/tones/bell.ogg\nsms.alert.enabled=false\n"));
+                              + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
 
-        m_service.setProcessChannelMode(QProcess::ForwardedChannels);
-        m_service.start(THEMELETD_BINARY, { "--no-default-watch", "--watch", m_watched });
-        QVERIFY(QTest::qWaitFor([&]() { return nameOwned(); }, 20000));
-        QVERIFY(QDBusConnection::sessionBus().connect(Service, Path, Service, "contentChanged", this, SLOT(recordChange(int))));
+        QVERIFY(Service::start(m_service, { m_watched }));
+        QVERIFY(QDBusConnection::sessionBus().connect(Service::Name, Service::Path, Service::Name, "contentChanged", this,
+                                                      SLOT(recordChange(int))));
         QVERIFY(QTest::qWaitFor([]() { return QFile::exists(TestDatabase::indexPath()); }));
         m_db = std::make_unique<TestDatabase>();
-
-        m_names = { { "package", m_package }, { "sandbox", m_sandbox }, { "watched", m_watched } };
-        QVERIFY(waitForRows("SELECT displayName FROM file JOIN themelet ON fileId = id WHERE fileName = 'sunset.themelet'", "Sunset"));
-        m_names.insert("sunsetId", themeletId("sunset.themelet"));
-        m_names.insert("toneId", query("SELECT id FROM file WHERE fileName = 'dusk.ogg'"));
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT displayName FROM file JOIN themelet ON fileId = id WHERE fileName = 'sunset.themelet'"), QString("Sunset"), 20000);
+        m_sunsetId = query("SELECT id FROM file WHERE fileName = 'sunset.themelet'").toLongLong();
     }
 
     void cleanupTestCase()
     {
         // The service may have been restarted by activation, away from m_service.
-        QDBusReply<uint> pid = QDBusConnection::sessionBus().interface()->servicePid(Service);
-        if (pid.isValid())
-            ::kill(pid.value(), SIGTERM);
-        QVERIFY(QTest::qWaitFor([&]() { return !nameOwned(); }, 20000));
+        if (const qint64 pid = Service::ownerPid())
+            ::kill(pid_t(pid), SIGTERM);
+        QVERIFY(QTest::qWaitFor([]() { return Service::ownerPid() == 0; }, 20000));
     }
 
     void introspection()
     {
-        QDBusReply<QString> xml = call("Introspect", {}, "org.freedesktop.DBus.Introspectable");
-        QVERIFY(xml.isValid());
+        QDBusReply<QString> xml = Service::call("Introspect", {}, 30000, "org.freedesktop.DBus.Introspectable");
         QFile contract(THEMELETD_XML);
-        QVERIFY(contract.open(QIODevice::ReadOnly));
+        QVERIFY(xml.isValid() && contract.open(QIODevice::ReadOnly));
         const QStringList expected = interfaceOutline(QString::fromUtf8(contract.readAll()));
         QVERIFY(expected.size() > 20);
         QCOMPARE(interfaceOutline(xml.value()), expected);
     }
 
+    // Each call changes rows and is announced by one contentChanged of its type (or more, from the loops).
     void methods_data()
     {
         QTest::addColumn<QString>("method");
@@ -186,24 +124,23 @@ private slots:
         QTest::addColumn<QString>("sql");
         QTest::addColumn<QString>("rows");
 
-        const QString themelet = "SELECT displayName, ringerVolume, favorite, (SELECT group_concat(resourceType || '=' || fileName) FROM "
-                                 "resource JOIN file ON id = resourceId WHERE fileId = %sunsetId) FROM file JOIN themelet ON fileId = id "
-                                 "WHERE id = %sunsetId";
+        const QString themelet = QStringLiteral("SELECT displayName, ringerVolume, favorite, (SELECT group_concat(resourceType || '=' "
+                                                "|| fileName) FROM resource JOIN file ON id = resourceId WHERE fileId = %1) FROM "
+                                                "file JOIN themelet ON fileId = id WHERE id = %1").arg(m_sunsetId);
+        const QVariant tone = map({ { "messageToneFile", map({ { "url", m_sandbox + "/loose/tone.ogg" } }) } });
         QTest::newRow("saveAttributes, nested")
-                << "saveAttributes"
-                << QVariantList { 1, qlonglong(0), map({ { "displayName", "Dusk" }, { "ringerVolume", 40 },
-                                                          { "resources", map({ { "messageToneFile", map({ { "url", "%sandbox/loose/tone.ogg" } }) } }) } }) }
+                << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "displayName", "Dusk" }, { "ringerVolume", 40 }, { "resources", tone } }) }
                 << "" << 1 << true << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
-        QTest::newRow("setFavorite") << "setFavorite" << QVariantList { "file://%package/images/sunset.jpg", false } << "true" << 1 << true
-                                     << themelet << "Dusk|40|0|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
-        QTest::newRow("indexFile") << "indexFile" << QVariantList { "file://%sandbox/loose/bell.ogg" } << "" << 0 << false
+        QTest::newRow("setFavorite") << "setFavorite" << QVariantList { "file://" + m_package + "/images/sunset.jpg", false } << "true"
+                                     << 1 << true << themelet << "Dusk|40|0|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
+        QTest::newRow("indexFile") << "indexFile" << QVariantList { "file://" + m_sandbox + "/loose/bell.ogg" } << "" << 0 << false
                                    << "SELECT mimeType FROM file WHERE fileName = 'bell.ogg'" << "audio/ogg";
-        QTest::newRow("installPackage") << "installPackage" << QVariantList { "%sandbox/extra" } << "" << 1 << false
+        QTest::newRow("installPackage") << "installPackage" << QVariantList { m_sandbox + "/extra" } << "" << 1 << false
                                         << "SELECT displayName, permissions FROM file JOIN themelet ON fileId = id "
                                            "WHERE fileName = 'aurora.themelet'" << "Aurora|1";
         // The package's file changed on disk: its name wins over the edited one.
         QTest::newRow("refreshThemelets") << "refreshThemelets" << QVariantList {} << "" << 1 << false
-                                          << "SELECT displayName FROM file WHERE id = %sunsetId" << "Sunrise";
+                                          << "SELECT displayName FROM file WHERE id = " + QString::number(m_sunsetId) << "Sunrise";
     }
 
     void methods()
@@ -216,32 +153,28 @@ private slots:
         QFETCH(QString, sql);
         QFETCH(QString, rows);
 
-        if (method == "saveAttributes")
-            arguments[1] = m_names.value("sunsetId").toLongLong();
         if (method == "indexFile")
-            QVERIFY(QFile::copy(m_sandbox + "/tones/bell.ogg", m_sandbox + "/loose/bell.ogg"));
+            QVERIFY(QFile::copy(m_sandbox + "/tones/bell #2.ogg", m_sandbox + "/loose/bell.ogg"));
         if (method == "refreshThemelets") {
             QVERIFY(write(m_package + "/sunset.themelet", R"({"wallpaper": "sunset.jpg", "displayName": "Sunrise", )"
                                                           R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})"));
             settle();
         }
-
         QVERIFY(quiet());
-        const QDBusMessage answer = call(method, arguments);
+        const QDBusMessage answer = Service::call(method, arguments);
         QCOMPARE(answer.type(), QDBusMessage::ReplyMessage);
-        QCOMPARE(answer.arguments().isEmpty() ? QString() : answer.arguments().first().toString(), reply);
-        QVERIFY(waitForRows(sql, rows));
+        QCOMPARE(answer.arguments().value(0).toString(), reply);
+        QTRY_COMPARE_WITH_TIMEOUT(query(sql), rows, 20000);
         settle();
         QVERIFY2(m_signals.contains(type), qPrintable(QTest::toString(m_signals)));
-        if (once)
-            QCOMPARE(m_signals.count(type), 1);
+        QVERIFY(!once || m_signals.count(type) == 1);
     }
 
     void watchedPicture()
     {
         QVERIFY(quiet());
         QVERIFY(writeJpeg(m_watched + "/new.jpg"));
-        QVERIFY(waitForRows("SELECT width, height FROM image JOIN file ON id = fileId WHERE fileName = 'new.jpg'", "64|48"));
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width, height FROM image JOIN file ON id = fileId WHERE fileName = 'new.jpg'"), QString("64|48"), 20000);
         settle();
         QVERIFY(m_signals.contains(2));
         // A .themelet file a user drops in gets its type from the MIME package.
@@ -250,62 +183,52 @@ private slots:
 
     void createAndSet()
     {
+        // Blue beats a smaller red; a light grey one has no hue and gets dark text. The second gets a name of its own.
         QImage picture(320, 200, QImage::Format_RGB32);
         picture.fill(QColor(20, 40, 200));
-        QVERIFY(QDir().mkpath(m_sandbox + "/pictures") && picture.save(m_sandbox + "/pictures/Blue Lagoon.png"));
-        const QString url = QUrl::fromLocalFile(m_sandbox + "/pictures/Blue Lagoon.png").toString();
+        QPainter(&picture).fillRect(0, 0, 100, 100, Qt::red);
+        QVERIFY(QDir().mkpath(m_sandbox + "/pictures/grey") && picture.save(m_sandbox + "/pictures/Blue Lagoon.png"));
+        picture.fill(QColor(200, 200, 200));
+        QVERIFY(picture.save(m_sandbox + "/pictures/grey/Blue Lagoon.png"));
 
-        // Sounds come from the profile while no themelet is active; the second copy gets a name of its own.
+        // Sounds come from the profile while no themelet is active; a "#" in a name is no URL fragment.
         QVERIFY(quiet());
-        const QDBusReply<qlonglong> first = call("createThemelet", { url });
-        const QDBusReply<qlonglong> second = call("createThemelet", { url });
+        const QDBusReply<qlonglong> first = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/Blue Lagoon.png").toString() }),
+                                    second = Service::call("createThemelet", { QUrl::fromLocalFile(m_sandbox + "/pictures/grey/Blue Lagoon.png").toString() });
         QVERIFY(first.isValid() && second.isValid() && first.value() > 0 && second.value() > first.value());
         const QString wallpapers = qEnvironmentVariable("XDG_DATA_HOME") + "/Vorka/themeletd/wallpapers/";
         const QString columns = "SELECT displayName, homeWallpaper, applicationWallpaper, highlightColor, secondaryHighlightColor, "
                                 "primaryColor, secondaryColor, ringerVolume, enabledSounds, (SELECT group_concat(resourceType || '=' "
                                 "|| fileName) FROM resource JOIN file ON id = resourceId WHERE fileId = %1) FROM file JOIN themelet "
                                 "ON fileId = id WHERE id = %1";
-        const QString made = "Blue Lagoon|%2|%2|#ff3344ff|#ff1f2999|#ffffffff|#a0ffffff|55|-3|ringerToneFile=bell.ogg";
-        QCOMPARE(query(columns.arg(first.value())), made.arg(wallpapers + "Blue Lagoon.png"));
-        QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png"));
+        const QString made = "Blue Lagoon|%1|%1|%2|55|-3|ringerToneFile=bell #2.ogg";
+        QCOMPARE(query(columns.arg(first.value())), made.arg(wallpapers + "Blue Lagoon.png", "#ff3344ff|#ff1f2999|#ffffffff|#a0ffffff"));
+        QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png", "#ffe6e6e6|#ff969696|#ff000000|#a0000000"));
         settle();
-        // Each creation is announced; the copies of the pictures are indexed as files and photos as well.
         QCOMPARE(m_signals.count(1), 2);
 
-        const QString themeletUrl = QUrl::fromLocalFile(wallpapers + "Blue Lagoon.png").toString();
-        const QDBusReply<qlonglong> set = call("setThemelet", { themeletUrl });
+        const QDBusReply<qlonglong> set = Service::call("setThemelet", { QUrl::fromLocalFile(wallpapers + "Blue Lagoon.png").toString() });
         QVERIFY(set.isValid());
         QCOMPARE(set.value(), first.value());
-        const QString profile = "/org/orbaline/themelet/profiles/themelet/";
-        const QString quoted = "'" + wallpapers + "Blue Lagoon.png'";
-        const QList<QPair<QString, QString>> applied {
-            { "/desktop/lunda/background/portrait/picture_filename", quoted },
-            { "/desktop/vorka/background/portrait/home_picture_filename", quoted },
-            { "/desktop/vorka/background/portrait/app_picture_filename", quoted },
-            { profile + "ringing.alert.volume", "55" },
-            { profile + "ringing.alert.tone", "'" + m_sandbox + "/tones/bell.ogg'" },
-            { profile + "ringing.alert.enabled", "true" },
-            { profile + "sms.alert.enabled", "false" },
-            { "/desktop/vorka/themelet/highlight_color", "'#ff3344ff'" },
-            { "/desktop/vorka/themelet/secondary_highlight_color", "'#ff1f2999'" },
-            { "/desktop/vorka/themelet/primary_color", "'#ffffffff'" },
-            { "/desktop/vorka/themelet/secondary_color", "'#a0ffffff'" },
-        };
-        for (const auto &key : applied)
-            QCOMPARE(DConfTest::read(key.first), key.second);
+        const QString background = "/desktop/vorka/background/portrait/", colours = "/desktop/vorka/themelet/",
+                      profile = "/org/orbaline/themelet/profiles/themelet/", quoted = "'" + wallpapers + "Blue Lagoon.png'";
+        const QStringList keys { "/desktop/lunda/background/portrait/picture_filename", background + "home_picture_filename",
+                                 background + "app_picture_filename", profile + "ringing.alert.volume", profile + "ringing.alert.tone",
+                                 profile + "ringing.alert.enabled", profile + "sms.alert.enabled", colours + "highlight_color",
+                                 colours + "secondary_highlight_color", colours + "primary_color", colours + "secondary_color" };
+        const auto values = [&keys]() { QStringList values; for (const QString &key : keys) values << DConfTest::read(key); return values; };
+        QCOMPARE(values(), QStringList({ quoted, quoted, quoted, "55", "'" + m_sandbox + "/tones/bell #2.ogg'", "true", "false",
+                                         "'#ff3344ff'", "'#ff1f2999'", "'#ffffffff'", "'#a0ffffff'" }));
 
         // An edit of the active themelet is applied again.
-        const QDBusMessage edit = call("saveAttributes", { 1, qlonglong(first.value()),
-                                                           map({ { "highlightColor", "#ff00ff00" }, { "ringerVolume", 30 },
-                                                                 { "messageToneEnabled", true } }) });
-        QCOMPARE(edit.type(), QDBusMessage::ReplyMessage);
-        QVERIFY(waitForKey("/desktop/vorka/themelet/highlight_color", "'#ff00ff00'"));
-        QCOMPARE(DConfTest::read(profile + "ringing.alert.volume"), QString("30"));
-        QCOMPARE(DConfTest::read(profile + "sms.alert.enabled"), QString("true"));
+        const QVariant edit = map({ { "highlightColor", "#ff00ff00" }, { "ringerVolume", 30 }, { "messageToneEnabled", true } });
+        QCOMPARE(Service::call("saveAttributes", { 1, first.value(), edit }).type(), QDBusMessage::ReplyMessage);
+        QTRY_COMPARE_WITH_TIMEOUT(DConfTest::read(colours + "highlight_color"), QString("'#ff00ff00'"), 10000);
+        QCOMPARE(values().mid(3, 4), QStringList({ "30", "'" + m_sandbox + "/tones/bell #2.ogg'", "true", "true" }));
 
         // Removing a themelet made here takes its copy of the picture along.
         m_signals.clear();
-        QCOMPARE(call("remove", { 1, qlonglong(second.value()) }).type(), QDBusMessage::ReplyMessage);
+        QCOMPARE(Service::call("remove", { 1, second.value() }).type(), QDBusMessage::ReplyMessage);
         QCOMPARE(query(QStringLiteral("SELECT count(*) FROM themelet WHERE fileId = %1").arg(second.value())), QString("0"));
         QVERIFY(!QFile::exists(wallpapers + "Blue Lagoon-2.png") && QFile::exists(wallpapers + "Blue Lagoon.png"));
         settle();
@@ -318,31 +241,27 @@ private slots:
         QTest::addColumn<QVariantList>("arguments");
         QTest::addColumn<QString>("error");
 
-        const QString invalid = "com.vorka.themeletd.Error.InvalidArgs", notFound = "com.vorka.themeletd.Error.NotFound";
-        const QVariantList save { 1, qlonglong(-1) };
+        const QString invalid = "InvalidArgs", notFound = "NotFound";
+        const qlonglong toneId = query("SELECT id FROM file WHERE fileName = 'dusk.ogg'").toLongLong();
         QTest::newRow("unknown type") << "saveAttributes" << QVariantList { 9, qlonglong(1), QVariantMap() } << invalid;
         QTest::newRow("type without manager") << "remove" << QVariantList { 3, qlonglong(1) } << invalid;
         QTest::newRow("unknown id") << "saveAttributes" << QVariantList { 1, qlonglong(999999), QVariantMap() } << notFound;
-        QTest::newRow("file is no themelet") << "remove" << QVariantList { 1, "%toneId" } << notFound;
-        QTest::newRow("package themelet") << "remove" << QVariantList { 1, "%sunsetId" } << "com.vorka.themeletd.Error.ReadOnly";
-        QTest::newRow("bad colour") << "saveAttributes" << QVariantList { 1, "%sunsetId", map({ { "highlightColor", "reddish" } }) }
-                                    << invalid;
-        QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, "%sunsetId", map({ { "ringerVolume", 1000 } }) }
-                                             << invalid;
+        QTest::newRow("file is no themelet") << "remove" << QVariantList { 1, toneId } << notFound;
+        QTest::newRow("package themelet") << "remove" << QVariantList { 1, m_sunsetId } << "ReadOnly";
+        QTest::newRow("bad colour") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "highlightColor", "reddish" } }) } << invalid;
+        QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "ringerVolume", 1000 } }) } << invalid;
         QTest::newRow("tone without url") << "saveAttributes"
-                                          << QVariantList { 1, "%sunsetId", map({ { "resources", map({ { "ringerToneFile", QVariantMap() } }) } }) }
+                                          << QVariantList { 1, m_sunsetId, map({ { "resources", map({ { "ringerToneFile", QVariantMap() } }) } }) }
                                           << invalid;
         QTest::newRow("web url") << "setThemelet" << QVariantList { "https://example.com/a.themelet" } << invalid;
         QTest::newRow("no themelet there") << "setThemelet" << QVariantList { "file:///nonexistent/a.themelet" } << notFound;
         QTest::newRow("relative package") << "installPackage" << QVariantList { "extra" } << invalid;
-        QTest::newRow("watched directory as package") << "installPackage" << QVariantList { "%watched" } << invalid;
+        QTest::newRow("watched directory as package") << "installPackage" << QVariantList { m_watched } << invalid;
         QTest::newRow("missing package") << "installPackage" << QVariantList { "/nonexistent" } << notFound;
         QTest::newRow("missing picture") << "createThemelet" << QVariantList { "file:///nonexistent.jpg" } << notFound;
-        QTest::newRow("no picture") << "createThemelet" << QVariantList { "file://%package/sunset.themelet" } << invalid;
+        QTest::newRow("no picture") << "createThemelet" << QVariantList { "file://" + m_package + "/sunset.themelet" } << invalid;
         QTest::newRow("device") << "createThemelet" << QVariantList { "file:///dev/zero" } << invalid;
-        QTest::newRow("empty url") << "indexFile" << QVariantList { "" } << invalid;
-        QTest::newRow("directory") << "indexFile" << QVariantList { "%sandbox" } << invalid;
-        QTest::newRow("wrong signature") << "saveAttributes" << QVariantList { "1", "2" } << "org.freedesktop.DBus.Error.UnknownMethod";
+        QTest::newRow("directory") << "indexFile" << QVariantList { m_sandbox } << invalid;
     }
 
     void errors()
@@ -350,30 +269,22 @@ private slots:
         QFETCH(QString, method);
         QFETCH(QVariantList, arguments);
         QFETCH(QString, error);
-
-        // Ids come as text from the table.
-        for (QVariant &argument : arguments) {
-            if (argument.toString().startsWith("%") && argument.toString().endsWith("Id"))
-                argument = expand(argument.toString()).toLongLong();
-        }
-        const QDBusMessage answer = call(method, arguments);
-        QCOMPARE(answer.type(), QDBusMessage::ErrorMessage);
-        QCOMPARE(answer.errorName(), error);
+        const QDBusMessage answer = Service::call(method, arguments);
+        QCOMPARE(answer.errorName(), "com.vorka.themeletd.Error." + error);
         QVERIFY(!answer.errorMessage().isEmpty() && !answer.errorMessage().contains('\n'));
-        QCOMPARE(call("Ping", {}, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
+        QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
     }
 
     void secondInstance()
     {
-        const QFileInfo index(TestDatabase::indexPath());
-        const QDateTime modified = index.lastModified();
+        const QDateTime modified = QFileInfo(TestDatabase::indexPath()).lastModified();
         QProcess second;
         second.start(THEMELETD_BINARY, { "--no-default-watch" });
         QVERIFY(second.waitForFinished(20000));
         QCOMPARE(second.exitCode(), 1);
         QCOMPARE(second.readAllStandardError(),
                  QByteArray("themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n"));
-        QCOMPARE(QFileInfo(index.filePath()).lastModified(), modified);
+        QCOMPARE(QFileInfo(TestDatabase::indexPath()).lastModified(), modified);
     }
 
     void stopAndRestart()
@@ -392,16 +303,14 @@ private slots:
         QVERIFY(QFile::remove(m_watched + "/new.jpg") && writeJpeg(m_watched + "/later.jpg"));
         const QString services = qEnvironmentVariable("XDG_DATA_HOME") + "/dbus-1/services";
         QVERIFY(QDir().mkpath(services));
-        QVERIFY(QFile::copy(THEMELETD_SHARE "/dbus-1/services/com.vorka.themeletd.service",
-                            services + "/com.vorka.themeletd.service"));
-        QDBusMessage reload = QDBusMessage::createMethodCall("org.freedesktop.DBus", "/org/freedesktop/DBus",
-                                                             "org.freedesktop.DBus", "ReloadConfig");
+        QVERIFY(QFile::copy(THEMELETD_SHARE "/dbus-1/services/com.vorka.themeletd.service", services + "/com.vorka.themeletd.service"));
+        const QDBusMessage reload = QDBusMessage::createMethodCall("org.freedesktop.DBus", "/org/freedesktop/DBus",
+                                                                   "org.freedesktop.DBus", "ReloadConfig");
         QCOMPARE(QDBusConnection::sessionBus().call(reload).type(), QDBusMessage::ReplyMessage);
-        QCOMPARE(call("Ping", {}, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
-
-        QVERIFY(waitForRows("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '%watched') "
-                            "ORDER BY fileName", "later.jpg;notes.themelet"));
-        QVERIFY(waitForRows("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'", "64"));
+        QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
+                                        + "') ORDER BY fileName"), QString("later.jpg;notes.themelet"), 20000);
+        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'"), QString("64"), 20000);
     }
 };
 

@@ -13,37 +13,6 @@ class tst_InstallManager : public QObject
 private slots:
     void initTestCase() { QVERIFY(installer()); }
 
-    void packageRoad()
-    {
-        const QString installDir = InstallManager::installPaths().at(0), package = installDir + "/sunset";
-        const QByteArray themelet = R"({"wallpaper": "sunset.jpg", "displayName": "Sunset", )"
-                                    R"("ringerToneFile": {"file": "dusk.ogg", "enabled": 1}})";
-        QVERIFY(writeTree(package, { "images/sunset.jpg", "images/dawn.jpg", "sounds/dusk.ogg" }, "x"));
-        QVERIFY(write(package + "/sunset.themelet", themelet));
-
-        // What the service does at its start; the loops do the rest.
-        for (const QString &path : InstallManager::installPaths())
-            installer()->appendDirectory(path);
-        QVERIFY(waitIdle());
-        const QString fileId = m_db.fileRows(package, "file.id").value(0);
-        const QString state = QStringLiteral("SELECT permissions, mimeType, metadataCurrent, displayName, scope, parentId = %1, "
-                                             "homeWallpaper, resourceType, (SELECT fileName FROM file WHERE id = resourceId) FROM file "
-                                             "JOIN directory ON directory.id = directoryId JOIN themelet ON fileId = file.id "
-                                             "JOIN resource USING (fileId) WHERE file.id = %2").arg(m_db.directoryId(installDir), fileId);
-        const QString read = "1|application/x-vorka-themelet|1|%1|2|1|" + package + "/images/%2.jpg|ringerToneFile|dusk.ogg";
-        QCOMPARE(m_db.rows(state), QStringList { read.arg("Sunset", "sunset") });
-
-        // A changed file is read again at the next install, into the same rows.
-        QVERIFY(write(package + "/sunset.themelet", QByteArray(themelet).replace("Sunset", "Dawn").replace("sunset", "dawn")));
-        QVERIFY(installFrom(installDir));
-        QCOMPARE(m_db.rows(state), QStringList { read.arg("Dawn", "dawn") });
-
-        // A package that is gone takes its rows along, by the triggers.
-        QVERIFY(QDir(package).removeRecursively() && installFrom(installDir) && m_db.directoryId(package).isEmpty());
-        QCOMPARE(m_db.value(QStringLiteral("SELECT (SELECT count(*) FROM file WHERE id = %1) + (SELECT count(*) FROM themelet WHERE "
-                                           "fileId = %1) + (SELECT count(*) FROM resource WHERE fileId = %1)").arg(fileId)).toInt(), 0);
-    }
-
     void scanMerge()
     {
         // Packages a, b and r on disk; rows b, c, y and z as an earlier run left

@@ -1,11 +1,43 @@
-#include "qmlrecordingservice.h"
-#include "testfixture.h"
+#include "recordingservice.h"
 
+#include <QProcess>
 #include <QQmlExtensionPlugin>
 #include <QtQml>
 
-// Test-only helpers, in a module of their own so that the module under test
-// is loaded exactly as a client loads it.
+// What a QML test needs from outside its engine: the sandbox's path, the dconf tool as
+// another process, the program that writes the index (qmlfixture), and the recording
+// stand-in for themeletd, which starts only when asked.
+class Fixture : public QObject
+{
+    Q_OBJECT
+    Q_PROPERTY(QString sandbox READ sandbox CONSTANT)
+public:
+    QString sandbox() const { return qEnvironmentVariable("THEMELET_SANDBOX"); }
+    // The tool's output, trimmed; a failure is a warning, which fails the test.
+    Q_INVOKABLE QString dconf(const QStringList &arguments) const { return run(QStringLiteral("dconf"), arguments).second; }
+    Q_INVOKABLE bool index(const QStringList &arguments) const { return run(qEnvironmentVariable("THEMELET_QML_FIXTURE"), arguments).first; }
+
+    Q_INVOKABLE bool startService() { return m_service.start(); }
+    Q_INVOKABLE bool emitContentChanged(int type) { return m_service.emitContentChanged(type); }
+    // Each call as [method, arguments...].
+    Q_INVOKABLE QVariantList takeCalls(int count = 0) { return m_service.take(count); }
+
+private:
+    static std::pair<bool, QString> run(const QString &program, const QStringList &arguments)
+    {
+        QProcess process;
+        process.setProcessChannelMode(QProcess::ForwardedErrorChannel);
+        process.start(program, arguments);
+        const bool ok = process.waitForFinished(120000) && process.exitStatus() == QProcess::NormalExit && process.exitCode() == 0;
+        if (!ok)
+            qWarning() << program << arguments << "failed";
+        return { ok, QString::fromUtf8(process.readAllStandardOutput()).trimmed() };
+    }
+
+    RecordingService m_service;
+};
+
+// A module of its own, so that the module under test is loaded exactly as a client loads it.
 class TestingPlugin : public QQmlExtensionPlugin
 {
     Q_OBJECT
@@ -13,9 +45,7 @@ class TestingPlugin : public QQmlExtensionPlugin
 public:
     void registerTypes(const char *uri) override
     {
-        qmlRegisterType<QmlRecordingService>(uri, 1, 0, "RecordingService");
-        qmlRegisterSingletonType<TestFixture>(uri, 1, 0, "Fixture",
-                                              [](QQmlEngine *, QJSEngine *) -> QObject * { return new TestFixture; });
+        qmlRegisterSingletonType<Fixture>(uri, 1, 0, "Fixture", [](QQmlEngine *, QJSEngine *) -> QObject * { return new Fixture; });
     }
 };
 

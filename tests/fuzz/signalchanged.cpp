@@ -1,5 +1,0 @@
-#include "content.h"
-
-void Content::signalChanged(int)
-{
-}
