@@ -11,6 +11,7 @@
 #include <QSqlError>
 
 #include <algorithm>
+#include <cerrno>
 #include <cstdlib>
 #include <cstring>
 #include <functional>
@@ -45,6 +46,9 @@ const uint32_t ArrivedMask = IN_CREATE | IN_MOVED_TO;                  // 0x180
 const uint32_t LeftMask = IN_MOVED_FROM | IN_DELETE | IN_DELETE_SELF;  // 0x640
 
 const int StackBufferSize = 4096;
+
+// The watch limit is per user: explained once, as every later directory fails the same way.
+bool s_watchLimitReported = false;
 
 // One entry of a directory listing, keyed by its name in UTF-8.
 struct DiskEntry
@@ -298,10 +302,17 @@ bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope
         mask = InstallScopeMask;
 
     const int wd = inotify_add_watch(m_inotifyFd, path.toUtf8().constData(), mask);
-    if (wd < 0)
-        qWarning() << "Failed to add listener" << wd << path; // indexed, but not watched
-    else
+    if (wd >= 0) {
         m_watches[wd] = WatchedDirectory { watchedPath, *id };
+        return true;
+    }
+    const int error = errno;
+    qWarning() << "Failed to add listener" << wd << path; // indexed, but not watched
+    if (error == ENOSPC && !s_watchLimitReported) {
+        s_watchLimitReported = true;
+        qWarning("The inotify watch limit is reached: directories beyond it are indexed, but changes "
+                 "in them are only seen at the next start. Raise fs.inotify.max_user_watches.");
+    }
     return true;
 }
 
@@ -342,6 +353,10 @@ bool FileManager::readEvent()
         const char *nameBytes = buffer + offset + headerSize;
         const size_t nameSize = qMin<size_t>(header.len, size_t(length - offset) - headerSize);
         offset += ssize_t(headerSize + header.len);
+
+        if (header.mask & IN_Q_OVERFLOW)
+            qWarning("The inotify event queue overflowed: changes made meanwhile are only seen at the "
+                     "next start. Raise fs.inotify.max_queued_events if this recurs.");
 
         const WatchedDirectory directory =
                 m_watches.isEmpty() ? WatchedDirectory() : m_watches.value(header.wd);
