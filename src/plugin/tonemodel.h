@@ -17,7 +17,7 @@ public:
 
     // The list's query, shared with readers outside QML (themeletctl).
     static QStringList toneCategories();
-    static FileQueryAgent::FileParameters toneParameters(const QStringList &categories);
+    static FileQueryAgent::FileParameters toneParameters(const QStringList &categories = toneCategories());
 
 private slots:
     void contentChanged(int type);

@@ -34,14 +34,15 @@ bool PackageFile::read(const QString &path, QByteArray *content)
         return false;
     // Read in pieces up to one byte past the limit, since the file may grow after its size
     // was asked; one read of the limit would allocate it whole for every small file.
+    const bool tooLarge = file.size() > MaximumSize;
     content->clear();
-    while (file.size() <= MaximumSize && content->size() <= MaximumSize) {
+    while (!tooLarge && content->size() <= MaximumSize) {
         const QByteArray piece = file.read(qMin<qint64>(64 * 1024, MaximumSize + 1 - content->size()));
         if (piece.isEmpty())
             break;
         content->append(piece);
     }
-    if (file.size() > MaximumSize || content->size() > MaximumSize) {
+    if (tooLarge || content->size() > MaximumSize) {
         qWarning() << "Skipping a file of more than" << MaximumSize << "bytes" << path;
         content->clear();
         return false;

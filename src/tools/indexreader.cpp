@@ -54,7 +54,7 @@ bool IndexReader::list(List which, QVector<Content> *rows)
     switch (which) {
     case Themelets: ok = reader->query(&collector, ThemeletQueryAgent::ThemeletParameters()); break;
     case Photos: ok = reader->query(&collector, QueryAgent::Parameters()); break;
-    case Tones: ok = reader->query(&collector, ToneModel::toneParameters(ToneModel::toneCategories())); break;
+    case Tones: ok = reader->query(&collector, ToneModel::toneParameters()); break;
     }
     if (!ok) {
         m_error = QStringLiteral("cannot read the index at ") + databasePath();
