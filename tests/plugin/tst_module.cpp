@@ -45,7 +45,9 @@ private slots:
         QLibrary now(m_moduleDir + QStringLiteral("/libthemelet.so"));
         now.setLoadHints(QLibrary::ResolveAllSymbolsHint);
         QVERIFY2(now.load(), qPrintable(now.errorString()));
-        QCOMPARE(QPluginLoader(now.fileName()).metaData().value(QStringLiteral("IID")).toString(), QStringLiteral("Orbaline.Themelet"));
+        const QJsonObject meta = QPluginLoader(now.fileName()).metaData();
+        QCOMPARE(meta.value(QStringLiteral("IID")).toString(), QStringLiteral("Orbaline.Themelet"));
+        QCOMPARE(meta.value(QStringLiteral("MetaData")), QJsonValue(QJsonObject()));
     }
 
     // Importing registers types and nothing else: no proxy, no D-Bus traffic. Profile
