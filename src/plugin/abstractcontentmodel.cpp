@@ -273,9 +273,10 @@ Content &AbstractContentModel::detachedRow(int index)
 
 void AbstractContentModel::saveAttributes(const Content &row, const QVariantMap &attributes)
 {
-    // The reply is not looked at: the row keeps its value until the next query replaces it.
+    // The row keeps its value until the next query replaces it; a refusal is only logged.
     if (ThemeletInterface *interface = ThemeletInterface::instance())
-        interface->saveAttributes(m_contentType, row.data()->id, attributes);
+        ThemeletInterface::warnOnError(interface->saveAttributes(m_contentType, row.data()->id, attributes), "saveAttributes",
+                                       m_contentType, row.data()->id);
 }
 
 bool AbstractContentModel::setData(const QModelIndex &index, const QVariant &value, int role)
@@ -344,7 +345,7 @@ void AbstractContentModel::remove(int index)
         return;
     // The row stays until the service's change notice has brought a new query.
     if (ThemeletInterface *interface = ThemeletInterface::instance())
-        interface->remove(m_contentType, row.data()->id);
+        ThemeletInterface::warnOnError(interface->remove(m_contentType, row.data()->id), "remove", m_contentType, row.data()->id);
 }
 
 QJSValue AbstractContentModel::get(int index) const

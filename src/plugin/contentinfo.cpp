@@ -94,7 +94,8 @@ void ContentInfo::save()
 {
     if (m_contentId != 0 && !m_changes.isEmpty()) {
         if (ThemeletInterface *interface = ThemeletInterface::instance())
-            interface->saveAttributes(m_contentType, m_contentId, m_changes);
+            ThemeletInterface::warnOnError(interface->saveAttributes(m_contentType, m_contentId, m_changes), "saveAttributes",
+                                           m_contentType, m_contentId);
     }
     m_changes.clear();
 }
@@ -104,7 +105,7 @@ void ContentInfo::remove()
     if (m_contentId == 0)
         return;
     if (ThemeletInterface *interface = ThemeletInterface::instance())
-        interface->remove(m_contentType, m_contentId);
+        ThemeletInterface::warnOnError(interface->remove(m_contentType, m_contentId), "remove", m_contentType, m_contentId);
     // The URL stays, and with m_queried set a later change notice doesn't reload it.
     m_contentId = 0;
     m_changes.clear();

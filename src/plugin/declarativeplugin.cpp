@@ -26,9 +26,24 @@ void DeclarativePlugin::initializeEngine(QQmlEngine *, const char *)
 {
 }
 
-// The service defines the real one, and its definition wins over this one.
-// A process that only loads the module never calls it, but a loader that
-// binds every symbol at load time (LD_BIND_NOW, -z now) needs a definition.
+// What moc writes for the IID and class name, plus "MetaData": {} (key 4, an empty CBOR map).
+QT_PLUGIN_METADATA_SECTION
+static constexpr unsigned char qt_pluginMetaData[] = {
+    'Q', 'T', 'M', 'E', 'T', 'A', 'D', 'A', 'T', 'A', ' ', '!',
+    0, QT_VERSION_MAJOR, QT_VERSION_MINOR, qPluginArchRequirements(),
+    0xbf,
+    0x02, 0x71, 'O', 'r', 'b', 'a', 'l', 'i', 'n', 'e', '.', 'T', 'h', 'e', 'm', 'e', 'l', 'e', 't',
+    0x03, 0x71, 'D', 'e', 'c', 'l', 'a', 'r', 'a', 't', 'i', 'v', 'e', 'P', 'l', 'u', 'g', 'i', 'n',
+    0x04, 0xa0,
+    0xff,
+};
+QT_MOC_EXPORT_PLUGIN(DeclarativePlugin, DeclarativePlugin)
+
+// Kept for clients without the service: the service (and themeletctl, the
+// tests) define the real one, which wins over this one. A QML application
+// that loads the module never calls it, but a loader that binds every symbol
+// at load time (LD_BIND_NOW, a -z now link, as Debian's hardening does) refuses
+// a library with an undefined one, and tst_module loads it that way.
 __attribute__((weak)) void Content::signalChanged(int)
 {
 }

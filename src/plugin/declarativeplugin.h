@@ -8,7 +8,9 @@
 class DeclarativePlugin : public QQmlExtensionPlugin
 {
     Q_OBJECT
-    Q_PLUGIN_METADATA(IID "Orbaline.Themelet")
+    // No Q_PLUGIN_METADATA: moc leaves an empty "MetaData" object out, and
+    // plugin tools want one. The record and the entry points are written out
+    // in the source instead.
 public:
     void registerTypes(const char *uri) override;
     void initializeEngine(QQmlEngine *engine, const char *uri) override;

@@ -3,6 +3,8 @@
 #include <QColor>
 #include <QDBusConnection>
 #include <QDBusMetaType>
+#include <QDBusPendingCallWatcher>
+#include <QDebug>
 #include <QUrl>
 
 const char *const ThemeletInterface::s_serviceName = "com.vorka.themeletd";
@@ -66,6 +68,20 @@ QDBusPendingReply<qlonglong> ThemeletInterface::setThemelet(const QString &url)
 QDBusPendingReply<bool> ThemeletInterface::setFavorite(const QString &url, bool value)
 {
     return asyncCallWithArgumentList(QStringLiteral("setFavorite"), { url, value });
+}
+
+void ThemeletInterface::warnOnError(const QDBusPendingCall &call, const char *method, int contentType, qlonglong contentId)
+{
+    ThemeletInterface *owner = instance();
+    if (!owner)
+        return;
+    auto *watcher = new QDBusPendingCallWatcher(call, owner);
+    const QString what = QStringLiteral("%1(%2, %3):").arg(QLatin1String(method)).arg(contentType).arg(contentId);
+    connect(watcher, &QDBusPendingCallWatcher::finished, watcher, [what](QDBusPendingCallWatcher *finished) {
+        if (finished->isError())
+            qWarning().noquote() << "Orbaline.Themelet: themeletd refused" << what << finished->error().message();
+        finished->deleteLater();
+    });
 }
 
 QVariant ThemeletInterface::dbusValue(const QVariant &value)

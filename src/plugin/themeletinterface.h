@@ -23,6 +23,11 @@ public:
     static QVariant dbusValue(const QVariant &value);
     static QVariantMap dbusMap(QVariantMap map);
 
+    // Writes from QML don't wait for their replies, and the caller keeps the
+    // value it wrote; a call that fails is told once in the log, as
+    // "Orbaline.Themelet: themeletd refused remove(1, 5): <the error>".
+    static void warnOnError(const QDBusPendingCall &call, const char *method, int contentType, qlonglong contentId);
+
 public slots:
     QDBusPendingReply<qlonglong> createThemelet(const QString &url);
     QDBusPendingReply<> indexFile(const QString &url);

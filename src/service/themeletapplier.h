@@ -4,6 +4,7 @@
 #include "content.h"
 
 #include <QStringList>
+#include <QVariant>
 
 // Carries a themelet to the device: its ringer volume, seven tone files and
 // seven switches into the sound profile "themelet", and its four colours as
@@ -15,19 +16,35 @@
 //   /desktop/vorka/themelet/secondary_color
 //
 // A tone the themelet doesn't have is cleared from the profile, so that the
-// profile's default sounds; an invalid colour resets its key.
+// profile's default sounds; an invalid colour resets its key. Only values that
+// differ from the stored ones are written, so applying the same themelet again
+// sends no change notices.
 class ThemeletApplier
 {
 public:
     static const char *const ProfileName;
 
     static QStringList colorKeys();
+    // The profile that was active before a themelet made "themelet" active.
+    static QString previousProfileKey();
     // Profile keys of the tone files and of the switches, in the order of ThemeletTones::keys().
     static QStringList toneKeys();
     static QStringList switchKeys();
     static const char *volumeKey();
 
     bool apply(const Themelet &themelet);
+    // Resets the colours and the profile "themelet" to its defaults.
+    bool clear();
+
+    // A themelet's sounds are heard: "themelet" becomes the active profile,
+    // unless the user chose "silent"; the profile it replaces is remembered.
+    void enterProfile();
+    // No themelet is active any more: the remembered profile comes back if
+    // "themelet" is still the active one.
+    void leaveProfile();
+
+private:
+    static bool store(const QString &key, const QVariant &value);
 };
 
 #endif

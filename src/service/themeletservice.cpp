@@ -15,6 +15,10 @@
 #include <QDir>
 #include <QFileInfo>
 #include <QSqlError>
+#include <QSqlRecord>
+
+#include <algorithm>
+#include <iterator>
 
 #include <cstdlib>
 
@@ -32,6 +36,14 @@ const char *const s_fileQuery =
         "WHERE file.id = ?;";
 
 const char *const s_directoryQuery = "SELECT scope FROM directory WHERE path = ?;";
+
+// Everything of a themelet that a save can change, to tell whether it changed anything.
+const char *const s_snapshotQuery =
+        "SELECT file.displayName, themelet.*, (SELECT group_concat(r) FROM (SELECT resourceType || '=' || resourceId AS r "
+        "FROM resource WHERE resource.fileId = ? ORDER BY 1)) FROM file JOIN themelet ON themelet.fileId = file.id "
+        "WHERE file.id = ?;";
+
+const char *const s_colorKeys[] = { "highlightColor", "secondaryHighlightColor", "primaryColor", "secondaryColor" };
 
 bool isInside(const QString &path, const QString &directory)
 {
@@ -110,7 +122,11 @@ void ThemeletService::start(const QStringList &watchedDirectories)
     m_directoryQuery = QSqlQuery(DbManager::instance());
     if (!m_directoryQuery.prepare(QLatin1String(s_directoryQuery)))
         qWarning() << "Failed to prepare m_directoryQuery." << m_directoryQuery.lastError();
+    m_snapshotQuery = QSqlQuery(DbManager::instance());
+    if (!m_snapshotQuery.prepare(QLatin1String(s_snapshotQuery)))
+        qWarning() << "Failed to prepare m_snapshotQuery." << m_snapshotQuery.lastError();
     connect(themelets, &ThemeletManager::activeThemeletUpdated, this, &ThemeletService::applyThemelet);
+    convergeActiveThemelet();
     new WalTrimmer(DbManager::instance(), MaxLogSize, 1000, this);
 
     for (const QString &path : InstallManager::installPaths())
@@ -132,6 +148,7 @@ void ThemeletService::stop()
     m_started = false;
     m_fileQuery = QSqlQuery();
     m_directoryQuery = QSqlQuery();
+    m_snapshotQuery = QSqlQuery();
     QSqlDatabase &database = DbManager::instance();
     {
         QSqlQuery checkpoint(database);
@@ -220,10 +237,11 @@ bool ThemeletService::checkThemeletValues(const QVariantMap &values)
     auto refuse = [this](const QString &key, const char *expected) {
         return fail(InvalidArgs, QStringLiteral("'%1' must be %2").arg(key, QLatin1String(expected)));
     };
+    const QStringList tones = ThemeletTones::keys();
     for (auto it = values.constBegin(); it != values.constEnd(); ++it) {
         const QString &key = it.key();
         const QVariant &value = it.value();
-        if (key.endsWith(QLatin1String("Color"))) {
+        if (std::find(std::begin(s_colorKeys), std::end(s_colorKeys), key) != std::end(s_colorKeys)) {
             if (value.userType() != QMetaType::QString || !QColor::isValidColor(value.toString()))
                 return refuse(key, "a colour such as \"#ff336699\"");
         } else if (key == QLatin1String("displayName")) {
@@ -232,24 +250,31 @@ bool ThemeletService::checkThemeletValues(const QVariantMap &values)
         } else if (key == QLatin1String("ringerVolume")) {
             if (!isInteger(value) || value.toLongLong() < 0 || value.toLongLong() > 100)
                 return refuse(key, "a whole number from 0 to 100");
-        } else if (key == QLatin1String("favorite") || key.endsWith(QLatin1String("ToneEnabled"))) {
+        } else if (key == QLatin1String("favorite")
+                   || (key.endsWith(QLatin1String("Enabled")) && tones.contains(key.chopped(7)))) {
             if (!isFlag(value))
                 return refuse(key, "a boolean");
         } else if (key == QLatin1String("resources")) {
             if (value.userType() != QMetaType::QVariantMap)
                 return refuse(key, "a map of tones");
             const QVariantMap resources = value.toMap();
-            const QStringList tones = ThemeletTones::keys();
             for (auto tone = resources.constBegin(); tone != resources.constEnd(); ++tone) {
-                const QVariantMap entry = tone.value().toMap();
+                const QString name = QStringLiteral("resources/") + tone.key();
+                if (!tone.key().endsWith(QLatin1String("File")) || !tones.contains(tone.key().chopped(4)))
+                    return refuse(name, "a tone such as \"ringerToneFile\"");
                 // The engine can't tell an entry without a url from one that clears the tone.
-                if (!tones.contains(tone.key().chopped(qMin(4, tone.key().size())))
-                    || !tone.key().endsWith(QLatin1String("File")))
-                    return refuse(QStringLiteral("resources/") + tone.key(), "a tone such as \"ringerToneFile\"");
-                if (tone.value().userType() != QMetaType::QVariantMap
-                    || entry.value(QStringLiteral("url")).userType() != QMetaType::QString)
-                    return refuse(QStringLiteral("resources/") + tone.key(), "a map with a string \"url\"");
+                const QVariant url = tone.value().toMap().value(QStringLiteral("url"));
+                if (tone.value().userType() != QMetaType::QVariantMap || url.userType() != QMetaType::QString)
+                    return refuse(name, "a map with a string \"url\"");
+                // The engine ignores any other url without a word.
+                const QString text = url.toString();
+                const QUrl parsed(text);
+                if (!text.isEmpty() && !text.startsWith(QLatin1Char('/'))
+                    && !(parsed.isLocalFile() && parsed.toLocalFile().startsWith(QLatin1Char('/'))))
+                    return refuse(name + QLatin1String("/url"), "empty, an absolute path or a file: url");
             }
+        } else {
+            return fail(InvalidArgs, QStringLiteral("'%1' is not an attribute of a themelet that can be saved").arg(key));
         }
     }
     return true;
@@ -258,6 +283,48 @@ bool ThemeletService::checkThemeletValues(const QVariantMap &values)
 void ThemeletService::applyThemelet(const Themelet &themelet)
 {
     m_applier.apply(themelet);
+}
+
+// No themelet is active: no key names a picture, the colours and the profile
+// "themelet" fall back to their defaults, and the profile from before returns.
+void ThemeletService::leaveThemelet()
+{
+    m_settings.setSource(QUrl());
+    m_settings.setHomeImagePath(QString());
+    m_settings.setApplicationImagePath(QString());
+    themeletManager()->updateActiveThemelet();
+    m_applier.clear();
+    m_applier.leaveProfile();
+}
+
+// The device may have changed while the service was down: it gets the active
+// themelet's values again (only those that differ are written), or loses a
+// themelet whose file is gone.
+void ThemeletService::convergeActiveThemelet()
+{
+    const QUrl source = m_settings.source();
+    if (source.isEmpty())
+        return;
+    const Themelet active = activeThemelet();
+    if (!active.isNull())
+        m_applier.apply(active);
+    else if (!QFileInfo::exists(source.toLocalFile()))
+        leaveThemelet();
+}
+
+QVariantList ThemeletService::themeletSnapshot(qint64 id)
+{
+    QVariantList values;
+    m_snapshotQuery.bindValue(0, id);
+    m_snapshotQuery.bindValue(1, id);
+    if (!m_snapshotQuery.exec())
+        qWarning() << "Failed to execute m_snapshotQuery" << m_snapshotQuery.lastError();
+    else if (m_snapshotQuery.next()) {
+        for (int i = 0; i < m_snapshotQuery.record().count(); ++i)
+            values << m_snapshotQuery.value(i);
+    }
+    m_snapshotQuery.finish();
+    return values;
 }
 
 Themelet ThemeletService::activeThemelet()
@@ -434,50 +501,75 @@ void ThemeletService::remove(int contentType, qlonglong contentId)
 {
     qDebug() << "remove" << contentType << contentId;
     ContentManager *manager = writableManager(contentType);
-    FileRow row;
-    if (!manager || !findContent(contentType, contentId, &row))
+    if (!manager)
         return;
+    // Refused or not, the clients query again: what they show is what is stored.
+    removeContent(manager, contentType, contentId);
+    Content::signalChanged(contentType);
+}
+
+bool ThemeletService::removeContent(ContentManager *manager, int contentType, qint64 contentId)
+{
+    FileRow row;
+    if (!findContent(contentType, contentId, &row))
+        return false;
+    bool active = false;
     if (contentType == ThemeletContent::Themelet) {
         // Removing a themelet deletes its pictures: only those that the service made may go.
-        if (row.permissions == 1) {
-            fail(ReadOnly, QStringLiteral("Themelet %1 belongs to a package").arg(contentId));
-            return;
-        }
+        if (row.permissions == 1)
+            return fail(ReadOnly, QStringLiteral("Themelet %1 belongs to a package").arg(contentId));
         for (const QString &picture : qAsConst(row.pictures)) {
-            if (!isInside(picture, ThemeletManager::wallpapersPath())) {
-                fail(ReadOnly, QStringLiteral("Themelet %1 shows a picture that themeletd did not make; "
-                                              "delete its file instead").arg(contentId));
-                return;
-            }
+            if (!isInside(picture, ThemeletManager::wallpapersPath()))
+                return fail(ReadOnly, QStringLiteral("Themelet %1 shows a picture that themeletd did not make; "
+                                                     "delete its file instead").arg(contentId));
         }
+        const Themelet current = activeThemelet();
+        active = !current.isNull() && current->id == contentId;
     }
-    if (!manager->remove(contentId)) {
-        fail(Failed, QStringLiteral("Content %1 of type %2 cannot be removed").arg(contentId).arg(contentType));
-        return;
-    }
-    Content::signalChanged(contentType);
+    if (!manager->remove(contentId))
+        return fail(Failed, QStringLiteral("Content %1 of type %2 cannot be removed").arg(contentId).arg(contentType));
+    if (active)
+        leaveThemelet();
+    return true;
 }
 
 void ThemeletService::saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
 {
     qDebug() << "saveAttributes" << contentType << contentId << args.keys();
     ContentManager *manager = writableManager(contentType);
+    if (!manager)
+        return;
+    bool changed = false;
+    // A refused write leaves its client showing a value that isn't stored: every client queries again.
+    if (!writeAttributes(manager, contentType, contentId, args, &changed) || changed)
+        Content::signalChanged(contentType);
+}
+
+bool ThemeletService::writeAttributes(ContentManager *manager, int contentType, qint64 contentId, const QVariantMap &args,
+                                      bool *changed)
+{
     FileRow row;
-    if (!manager || !findContent(contentType, contentId, &row))
-        return;
+    if (!findContent(contentType, contentId, &row))
+        return false;
     const QVariantMap values = plainDBusMap(args);
-    if (contentType == ThemeletContent::Themelet && !checkThemeletValues(values))
-        return;
-    if (!manager->save(contentId, values)) {
-        fail(Failed, QStringLiteral("Content %1 of type %2 could not be saved").arg(contentId).arg(contentType));
-        return;
-    }
-    Content::signalChanged(contentType);
+    const bool themelet = contentType == ThemeletContent::Themelet;
+    if (themelet && !checkThemeletValues(values))
+        return false;
+    const QVariantList before = themelet ? themeletSnapshot(contentId) : QVariantList();
+    if (!manager->save(contentId, values))
+        return fail(Failed, QStringLiteral("Content %1 of type %2 could not be saved").arg(contentId).arg(contentType));
+    *changed = !themelet || before.isEmpty() || themeletSnapshot(contentId) != before;
+    return true;
 }
 
 qlonglong ThemeletService::setThemelet(const QString &url)
 {
     qDebug().noquote() << "setThemelet" << url;
+    if (url.isEmpty()) {
+        // An empty url activates no themelet.
+        leaveThemelet();
+        return 0;
+    }
     const QString path = localPath(url, "themelet");
     if (path.isEmpty())
         return 0;
@@ -493,6 +585,7 @@ qlonglong ThemeletService::setThemelet(const QString &url)
     // The store's notice comes later; an edit made before it must already find this one active.
     manager->updateActiveThemelet();
     applyThemelet(themelet);
+    m_applier.enterProfile();
     return themelet->id;
 }
 

@@ -63,7 +63,12 @@ private:
     ContentManager *writableManager(int contentType);
     bool findContent(int contentType, qint64 id, FileRow *row);
     bool checkThemeletValues(const QVariantMap &values);
+    bool writeAttributes(ContentManager *manager, int contentType, qint64 id, const QVariantMap &args, bool *changed);
+    bool removeContent(ContentManager *manager, int contentType, qint64 id);
+    QVariantList themeletSnapshot(qint64 id);
     void applyThemelet(const Themelet &themelet);
+    void leaveThemelet();
+    void convergeActiveThemelet();
     Themelet activeThemelet();
     QString copyToWallpapers(const QString &path);
 
@@ -75,6 +80,7 @@ private:
     ThemeletSettings m_settings;
     QSqlQuery m_fileQuery;
     QSqlQuery m_directoryQuery;
+    QSqlQuery m_snapshotQuery;
     bool m_started = false;
 };
 

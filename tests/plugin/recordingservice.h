@@ -68,17 +68,17 @@ public:
 
     QVariantList calls;
     qlonglong replyId = 0;
-    QString errorMessage; // answers createThemelet and setThemelet with an error when set
+    QString errorMessage; // answers createThemelet, setThemelet, remove and saveAttributes with an error when set
 
 public slots:
     qlonglong createThemelet(const QString &url) { return record({ "createThemelet", url }, true); }
     void indexFile(const QString &url) { record({ "indexFile", url }); }
     void installPackage(const QString &path) { record({ "installPackage", path }); }
     void refreshThemelets() { record({ "refreshThemelets" }); }
-    void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }); }
+    void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }, true); }
     void saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
     {
-        record({ "saveAttributes", contentType, contentId, plain(args) });
+        record({ "saveAttributes", contentType, contentId, plain(args) }, true);
     }
     qlonglong setThemelet(const QString &url) { return record({ "setThemelet", url }, true); }
     bool setFavorite(const QString &url, bool value) { return record({ "setFavorite", url, value }) != 0; }

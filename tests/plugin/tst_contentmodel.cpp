@@ -275,6 +275,15 @@ private slots:
         QCOMPARE(service.take(1), QVariantList { QVariant(QVariantList { "remove", 1, id }) });
         QCOMPARE(model.count(), 1);
         QCOMPARE(count.count(), 0);
+
+        // A write that the service refuses is told once in the log; the local row is left to the next query.
+        service.errorMessage = "No way";
+        const MessageLog messages;
+        model.remove(0);
+        model.setProperty(0, "displayName", "Cove");
+        QTRY_COMPARE(messages.warnings(), QStringList({ QString("Orbaline.Themelet: themeletd refused remove(1, %1): No way").arg(id),
+                                                        QString("Orbaline.Themelet: themeletd refused saveAttributes(1, %1): No way").arg(id) }));
+        QCOMPARE(model.index(0, 0).data(ThemeletData::DisplayNameRole).toString(), QString("Cove"));
     }
 
     void filter()

@@ -45,7 +45,9 @@ private slots:
         QLibrary now(m_moduleDir + QStringLiteral("/libthemelet.so"));
         now.setLoadHints(QLibrary::ResolveAllSymbolsHint);
         QVERIFY2(now.load(), qPrintable(now.errorString()));
-        QCOMPARE(QPluginLoader(now.fileName()).metaData().value(QStringLiteral("IID")).toString(), QStringLiteral("Orbaline.Themelet"));
+        const QJsonObject meta = QPluginLoader(now.fileName()).metaData();
+        QCOMPARE(meta.value(QStringLiteral("IID")).toString(), QStringLiteral("Orbaline.Themelet"));
+        QCOMPARE(meta.value(QStringLiteral("MetaData")), QJsonValue(QJsonObject()));
     }
 
     // Importing registers types and nothing else: no proxy, no D-Bus traffic. Profile
@@ -72,6 +74,12 @@ private slots:
                        " property QtObject d: ToneModel {}; property QtObject e: Profile {}; property QtObject f: Themelet }", &errors));
         QVERIFY(!create("AbstractContentModel {}", &errors));
         QCOMPARE(errors, QStringList { "AbstractContentModel is not a type" });
+        // A literal id is refused with the engine's words, which the module's documentation quotes.
+        errors.clear();
+        QVERIFY(!create("ContentInfo { contentId: 39 }", &errors) && create("ContentInfo { contentId: 39 + 0 }", &errors));
+        QFile doc(QStringLiteral(THEMELET_QML_DOC));
+        QVERIFY(errors.size() == 1 && doc.open(QIODevice::ReadOnly));
+        QVERIFY2(QString::fromUtf8(doc.readAll()).contains(errors.first()), qPrintable(errors.first()));
 
         QFile qmldir(m_moduleDir + QStringLiteral("/qmldir"));
         QFile types(m_moduleDir + QStringLiteral("/plugins.qmltypes"));

@@ -1,5 +1,6 @@
 // The real themeletd on the sandbox's private bus, with the integration files of the build tree.
 #include "dconftest.h"
+#include "profilemanager.h"
 #include "servicefixture.h"
 #include "sysroot.h"
 
@@ -113,7 +114,8 @@ private slots:
         QCOMPARE(interfaceOutline(xml.value()), expected);
     }
 
-    // Each call changes rows and is announced by one contentChanged of its type (or more, from the loops).
+    // Each call changes rows and is announced by one contentChanged of its type (or more, from the loops);
+    // a write that changes nothing is not announced (type -1).
     void methods_data()
     {
         QTest::addColumn<QString>("method");
@@ -131,6 +133,11 @@ private slots:
         QTest::newRow("saveAttributes, nested")
                 << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "displayName", "Dusk" }, { "ringerVolume", 40 }, { "resources", tone } }) }
                 << "" << 1 << true << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
+        QTest::newRow("saveAttributes, same values")
+                << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "displayName", "Dusk" }, { "favorite", true }, { "resources", tone } }) }
+                << "" << -1 << false << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
+        QTest::newRow("saveAttributes, empty") << "saveAttributes" << QVariantList { 1, m_sunsetId, QVariantMap() } << "" << -1 << false
+                                               << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
         QTest::newRow("setFavorite") << "setFavorite" << QVariantList { "file://" + m_package + "/images/sunset.jpg", false } << "true"
                                      << 1 << true << themelet << "Dusk|40|0|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
         QTest::newRow("indexFile") << "indexFile" << QVariantList { "file://" + m_sandbox + "/loose/bell.ogg" } << "" << 0 << false
@@ -166,7 +173,7 @@ private slots:
         QCOMPARE(answer.arguments().value(0).toString(), reply);
         QTRY_COMPARE_WITH_TIMEOUT(query(sql), rows, 20000);
         settle();
-        QVERIFY2(m_signals.contains(type), qPrintable(QTest::toString(m_signals)));
+        QVERIFY2(type < 0 ? m_signals.isEmpty() : m_signals.contains(type), qPrintable(QTest::toString(m_signals)));
         QVERIFY(!once || m_signals.count(type) == 1);
     }
 
@@ -207,6 +214,12 @@ private slots:
         settle();
         QCOMPARE(m_signals.count(1), 2);
 
+        // Its sounds are heard: the profile "themelet" becomes the active one, unless the user chose silence.
+        const QString activeProfile = "/org/orbaline/themelet/profile";
+        DConfTest::write(activeProfile, "'silent'");
+        QCOMPARE(Service::call("setThemelet", { QUrl::fromLocalFile(wallpapers + "Blue Lagoon.png").toString() }).type(), QDBusMessage::ReplyMessage);
+        QCOMPARE(DConfTest::read(activeProfile), QString("'silent'"));
+        DConfTest::reset(activeProfile);
         const QDBusReply<qlonglong> set = Service::call("setThemelet", { QUrl::fromLocalFile(wallpapers + "Blue Lagoon.png").toString() });
         QVERIFY(set.isValid());
         QCOMPARE(set.value(), first.value());
@@ -219,6 +232,8 @@ private slots:
         const auto values = [&keys]() { QStringList values; for (const QString &key : keys) values << DConfTest::read(key); return values; };
         QCOMPARE(values(), QStringList({ quoted, quoted, quoted, "55", "'" + m_sandbox + "/tones/bell #2.ogg'", "true", "false",
                                          "'#ff3344ff'", "'#ff1f2999'", "'#ffffffff'", "'#a0ffffff'" }));
+        ProfileManager sounds;
+        QTRY_COMPARE(sounds.activeProfile(), ProfileManager::Themelet);
 
         // An edit of the active themelet is applied again.
         const QVariant edit = map({ { "highlightColor", "#ff00ff00" }, { "ringerVolume", 30 }, { "messageToneEnabled", true } });
@@ -233,6 +248,12 @@ private slots:
         QVERIFY(!QFile::exists(wallpapers + "Blue Lagoon-2.png") && QFile::exists(wallpapers + "Blue Lagoon.png"));
         settle();
         QVERIFY(m_signals.contains(1));
+
+        // Removing the active one leaves no key naming its deleted picture, and the profile from before.
+        QCOMPARE(Service::call("remove", { 1, first.value() }).type(), QDBusMessage::ReplyMessage);
+        QVERIFY(!QFile::exists(wallpapers + "Blue Lagoon.png"));
+        QTRY_COMPARE(values(), QStringList({ "''", "''", "''" }) + QVector<QString>(keys.size() - 3).toList());
+        QTRY_COMPARE(sounds.activeProfile(), ProfileManager::General);
     }
 
     void errors_data()
@@ -250,6 +271,10 @@ private slots:
         QTest::newRow("package themelet") << "remove" << QVariantList { 1, m_sunsetId } << "ReadOnly";
         QTest::newRow("bad colour") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "highlightColor", "reddish" } }) } << invalid;
         QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "ringerVolume", 1000 } }) } << invalid;
+        QTest::newRow("unknown key") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "shadowColor", "#ff000000" } }) } << invalid;
+        QTest::newRow("relative tone") << "saveAttributes"
+                                       << QVariantList { 1, m_sunsetId, map({ { "resources", map({ { "ringerToneFile", map({ { "url", "a.ogg" } }) } }) } }) }
+                                       << invalid;
         QTest::newRow("tone without url") << "saveAttributes"
                                           << QVariantList { 1, m_sunsetId, map({ { "resources", map({ { "ringerToneFile", QVariantMap() } }) } }) }
                                           << invalid;
@@ -269,9 +294,14 @@ private slots:
         QFETCH(QString, method);
         QFETCH(QVariantList, arguments);
         QFETCH(QString, error);
+        m_signals.clear();
         const QDBusMessage answer = Service::call(method, arguments);
         QCOMPARE(answer.errorName(), "com.vorka.themeletd.Error." + error);
         QVERIFY(!answer.errorMessage().isEmpty() && !answer.errorMessage().contains('\n'));
+        // A refused write of a known type makes the clients show the stored values again.
+        const int type = arguments.value(0).toInt();
+        if ((method == "saveAttributes" || method == "remove") && type >= 0 && type <= 4 && type != 3)
+            QTRY_VERIFY(m_signals.contains(type));
         QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
     }
 
@@ -289,6 +319,9 @@ private slots:
 
     void stopAndRestart()
     {
+        QCOMPARE(Service::call("setThemelet", { "file://" + m_package + "/sunset.themelet" }).type(), QDBusMessage::ReplyMessage);
+        const QString volume = "/org/orbaline/themelet/profiles/themelet/ringing.alert.volume", colour = "/desktop/vorka/themelet/primary_color";
+        QTRY_COMPARE(DConfTest::read(volume), query("SELECT ringerVolume FROM themelet WHERE fileId = " + QString::number(m_sunsetId)));
         m_db.reset();
         m_service.terminate();
         QVERIFY(m_service.waitForFinished(20000));
@@ -301,6 +334,9 @@ private slots:
 
         // While it is down the disk changes; the service comes back by activation.
         QVERIFY(QFile::remove(m_watched + "/new.jpg") && writeJpeg(m_watched + "/later.jpg"));
+        const QString applied = DConfTest::read(volume);
+        DConfTest::write(volume, "99");
+        DConfTest::write(colour, "'#ff123456'");
         const QString services = qEnvironmentVariable("XDG_DATA_HOME") + "/dbus-1/services";
         QVERIFY(QDir().mkpath(services));
         QVERIFY(QFile::copy(THEMELETD_SHARE "/dbus-1/services/com.vorka.themeletd.service", services + "/com.vorka.themeletd.service"));
@@ -311,6 +347,9 @@ private slots:
         QTRY_COMPARE_WITH_TIMEOUT(query("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
                                         + "') ORDER BY fileName"), QString("later.jpg;notes.themelet"), 20000);
         QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'"), QString("64"), 20000);
+        // The device follows the active themelet again.
+        QCOMPARE(DConfTest::read(volume), applied);
+        QCOMPARE(DConfTest::read(colour), QString());
     }
 };
 

@@ -24,6 +24,15 @@ ApplicationWindow {
 
     property string message
 
+    // The themelet made last. contentId is a 64-bit id, for which QML 5.15 has no
+    // literal: "contentId: 39" is refused, "contentId: 39 + 0" or a script
+    // assignment works (docs/qml.md).
+    ContentInfo {
+        id: createdThemelet
+        contentType: ContentInfo.Themelet
+        property string displayName
+    }
+
     function statusName(status) { return statusNames[status] || "Unknown" }
     function inactiveThemelet() {
         for (var i = 0; i < themelets.count; ++i) {
@@ -130,7 +139,10 @@ ApplicationWindow {
             x: panes.paneX(1); width: panes.paneWidth(1); height: panes.height
             visible: panes.paneVisible(1)
             photoModel: photos
-            onCreated: window.message = qsTr("Created themelet %1 from %2").arg(contentId).arg(name)
+            onCreated: {
+                createdThemelet.contentId = contentId
+                window.message = qsTr("Created themelet %1 from %2").arg(createdThemelet.displayName || contentId).arg(name)
+            }
         }
         TonePane {
             x: panes.paneX(2); width: panes.paneWidth(2); height: panes.height
