@@ -1,6 +1,7 @@
 // The real themeletd on the sandbox's private bus, with the integration files of the build tree.
 #include "dconftest.h"
 #include "servicefixture.h"
+#include "profiledefaults.h"
 #include "sysroot.h"
 
 #include <QPainter>
@@ -82,7 +83,7 @@ private slots:
         QVERIFY(write(m_sandbox + "/extra/aurora.themelet", R"({"wallpaper": "aurora.jpg", "displayName": "Aurora"})"));
         QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell #2.ogg", "OggS"));
         QVERIFY(write(m_watched + "/notes.themelet", "{}"));
-        QVERIFY(write(Sysroot::path("/etc/themelet/profiles.ini"),
+        QVERIFY(write(ProfileDefaults::path(),
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
                               + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
 
