@@ -13,7 +13,8 @@ mkdir -p "$work/consumer"
 DESTDIR= cmake --install "$build" --prefix "$prefix" >"$work/install.log" || { cat "$work/install.log"; fail "cmake --install"; }
 ! grep -v "^$prefix/" "$build/install_manifest.txt" || fail "installed outside the prefix"
 libdir=$(dirname "$(find "$prefix" -name 'libthemelet.so.1' -path '*/lib*')")
-ldd "$prefix/bin/themeletd" | grep -q "libthemelet.so.1 => $prefix/" || fail "themeletd does not find its library: $(ldd "$prefix/bin/themeletd")"
+ldd "$prefix/bin/themeletd" >"$work/ldd"
+grep -q "libthemelet.so.1 => $prefix/" "$work/ldd" || fail "themeletd does not find its library: $(cat "$work/ldd")"
 qml=$(find "$prefix" -name qmldir -path '*/qt5/qml/Orbaline/Themelet/*')
 [ "${qml#"$prefix"/lib/*/qt5/qml/}" = Orbaline/Themelet/qmldir ] || fail "QML module at $qml"
 echo 'import Orbaline.Themelet 1.0; import QtQuick 2.0; Item { Component.onCompleted: Qt.quit() }' >"$work/module.qml"
