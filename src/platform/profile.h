@@ -9,7 +9,7 @@
 //   /org/orbaline/themelet/profiles/<profile>/<key>  one value of a profile
 //
 // A value that a profile hasn't set is read from the defaults file
-// $THEMELET_SYSROOT/etc/themelet/profiles.ini (see ProfileDefaults), first from
+// $THEMELET_SYSROOT<sysconfdir>/themelet/profiles.ini (see ProfileDefaults), first from
 // the profile's own group, then from the group [fallback]. The profile
 // "fallback" holds the system's own tones.
 //

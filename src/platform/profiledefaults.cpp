@@ -43,7 +43,7 @@ ProfileDefaults::ProfileDefaults()
 
 QString ProfileDefaults::path()
 {
-    return Sysroot::path(QStringLiteral("/etc/themelet/profiles.ini"));
+    return Sysroot::path(QStringLiteral(THEMELET_SYSCONFDIR "/themelet/profiles.ini"));
 }
 
 QString ProfileDefaults::value(const QString &group, const QString &key) const

@@ -6,7 +6,8 @@
 #include <QStringList>
 
 // The defaults of the sound profiles, read from the key file
-// $THEMELET_SYSROOT/etc/themelet/profiles.ini: one group per profile, named
+// $THEMELET_SYSROOT<sysconfdir>/themelet/profiles.ini (sysconfdir: /etc for the
+// /usr prefix, fixed at build time): one group per profile, named
 // after it, with one "key=value" line per value, in the GLib key file format
 // (UTF-8, "#" comments, escapes such as "\s" for a leading space). The group
 // [fallback] is the profile "fallback", and it also answers for every key

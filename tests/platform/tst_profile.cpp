@@ -1,6 +1,6 @@
 #include "dconftest.h"
 #include "profile.h"
-#include "sysroot.h"
+#include "profiledefaults.h"
 
 #include <QtTest>
 
@@ -11,7 +11,7 @@ static char s_active[] = "active", s_change[] = "change", s_current[] = "current
 
 static void writeDefaults(const QByteArray &content)
 {
-    QFile file(Sysroot::path(QStringLiteral("/etc/themelet/profiles.ini")));
+    QFile file(ProfileDefaults::path());
     QVERIFY(QDir().mkpath(QFileInfo(file).path()) && file.open(QIODevice::WriteOnly) && file.write(content) == content.size());
 }
 

@@ -34,6 +34,9 @@ private slots:
 
         // Unreadable files are read like any other: they get a row and become current.
         QTest::newRow("exif first, xmp fills in") << "" << "64|48|2015-06-02T08:30:00.000|6" << QStringList();
+        // Read by Qt's image-format plugins, which the packages depend on.
+        QTest::newRow("webp") << "webp" << "64|48|NULL|NULL" << QStringList();
+        QTest::newRow("svg") << "svg" << "64|48|NULL|NULL" << QStringList();
         QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("vanished") << "vanished" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
@@ -51,8 +54,13 @@ private slots:
         QFETCH(QString, damage);
         QFETCH(QString, image);
         QFETCH(QStringList, warnings);
-        const QString path = m_dir + "/picture.jpg";
-        if (damage == "corrupt")
+        const QString name = "picture." + (damage == "webp" || damage == "svg" ? damage : QString("jpg"));
+        const QString path = m_dir + "/" + name;
+        if (damage == "webp")
+            QVERIFY(QImage(64, 48, QImage::Format_RGB32).save(path));
+        else if (damage == "svg")
+            QVERIFY(write(path, "<svg xmlns='http://www.w3.org/2000/svg' width='64' height='48'/>"));
+        else if (damage == "corrupt")
             QVERIFY(write(path, QByteArray(2048, 'x')));
         else if (damage == "fifo")
             QVERIFY(::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
@@ -60,7 +68,7 @@ private slots:
             QVERIFY(writeJpeg(path, { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00", "set Xmp.tiff.Orientation 3",
                                       "set Exif.Image.Orientation 6" }));
         m_sql.exec({ QString("INSERT INTO file (id, directoryId, mimeType, fileName, permissions, metadataCurrent) "
-                              "VALUES (1, %1, 'image/jpeg', 'picture.jpg', 3, 0);").arg(damage == "orphan" ? 9 : 1),
+                              "VALUES (1, %1, 'image/jpeg', '%2', 3, 0);").arg(damage == "orphan" ? 9 : 1).arg(name),
                       "INSERT INTO image VALUES (1, 'old', 1, 1, 1);" });
         if (damage.contains(" ON "))
             m_sql.exec(QString("CREATE TRIGGER refuse BEFORE %1 BEGIN SELECT RAISE(ABORT, 'no'); END;").arg(damage));

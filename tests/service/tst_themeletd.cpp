@@ -2,6 +2,7 @@
 #include "dconftest.h"
 #include "profilemanager.h"
 #include "servicefixture.h"
+#include "profiledefaults.h"
 #include "sysroot.h"
 
 #include <QPainter>
@@ -83,7 +84,7 @@ private slots:
         QVERIFY(write(m_sandbox + "/extra/aurora.themelet", R"({"wallpaper": "aurora.jpg", "displayName": "Aurora"})"));
         QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell #2.ogg", "OggS"));
         QVERIFY(write(m_watched + "/notes.themelet", "{}"));
-        QVERIFY(write(Sysroot::path("/etc/themelet/profiles.ini"),
+        QVERIFY(write(ProfileDefaults::path(),
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
                               + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
 
