@@ -102,7 +102,11 @@ private:
     bool m_contentReceived = false;
     bool m_synchronizing = false;
     // Row signals run script handlers; a filter change made from one of them
-    // waits until the walk that emitted the signal has ended.
+    // waits until the walk that emitted the signal has ended. Applied at once,
+    // it would swap m_currentContent under the walk, whose remaining inserts
+    // and removes would then land in the other list at the walk's indexes:
+    // rows out of range, a crash. So `count` read in such a handler is the
+    // one before the filter; countChanged follows when the filter is applied.
     int m_editDepth = 0;
     int m_deferredFilter = -1;
     bool m_deferredRefilter = false;
