@@ -17,7 +17,7 @@ public:
     DbManager();
     ~DbManager() override;
 
-    bool createDatabaseSchema(const QSqlDatabase &database);
+    static bool createDatabaseSchema(const QSqlDatabase &database);
     bool updateSchemaVersion(const QString &version);
     bool updateSchema_v7to8();
     bool updateSchema_v8to10();

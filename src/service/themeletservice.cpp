@@ -3,8 +3,10 @@
 #include "dbmanager.h"
 #include "dbusvalue.h"
 #include "filemanager.h"
+#include "indexcreator.h"
 #include "installmanager.h"
 #include "profile.h"
+#include "queryagent.h"
 #include "themeletcolor.h"
 #include "themeletmanager.h"
 #include "themelettones.h"
@@ -105,6 +107,7 @@ InstallManager *ThemeletService::installManager()
 
 void ThemeletService::start(const QStringList &watchedDirectories)
 {
+    IndexCreator::ensure(QueryAgent::databaseUrl(0).toLocalFile());
     // The file manager's constructor opens the index and queues every known root.
     FileManager *files = FileManager::instance();
     InstallManager *installer = installManager();

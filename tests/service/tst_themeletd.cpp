@@ -88,7 +88,11 @@ private slots:
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
                               + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
 
+        // A first index half-made by a killed start is thrown away, never used.
+        const QString halfMade = TestDatabase::indexPath() + ".new";
+        QVERIFY(write(halfMade, "SQLite format 3"));
         QVERIFY(Service::start(m_service, { m_watched }));
+        QVERIFY(!QFile::exists(halfMade));
         QVERIFY(QDBusConnection::sessionBus().connect(Service::Name, Service::Path, Service::Name, "contentChanged", this,
                                                       SLOT(recordChange(int))));
         QVERIFY(QTest::qWaitFor([]() { return QFile::exists(TestDatabase::indexPath()); }));
