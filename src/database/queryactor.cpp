@@ -5,6 +5,8 @@
 #include <QDebug>
 #include <QSqlError>
 
+#include <algorithm>
+
 QueryActor::QueryActor(QueryAgentDatabase &database)
     : m_database(database)
 {
@@ -71,9 +73,28 @@ bool QueryActor::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
 {
     if (columns.isEmpty() || columns.first().isEmpty())
         return true;
-    for (int i = 0; i < columns.size(); ++i)
-        query.bindValue(i, columns.at(i));
+    for (int i = 0; i < columns.size(); ++i) {
+        const QVariantList &column = columns.at(i);
+        const auto marked = std::find_if(column.cbegin(), column.cend(), [](const QVariant &value) {
+            return value.userType() == QMetaType::QString && value.toString().startsWith(QChar(0xFEFF));
+        });
+        if (marked == column.cend()) {
+            query.bindValue(i, column);
+            continue;
+        }
+        QVariantList kept = column;
+        for (QVariant &value : kept) {
+            if (value.userType() == QMetaType::QString)
+                value = text(value.toString());
+        }
+        query.bindValue(i, kept);
+    }
     return execBatch(query, function, failure);
+}
+
+QVariant QueryActor::text(const QString &value)
+{
+    return value.startsWith(QChar(0xFEFF)) ? QVariant(QChar(0xFEFF) + value) : QVariant(value);
 }
 
 bool QueryActor::execBatch(QSqlQuery &query, const char *function, const char *failure)

@@ -42,6 +42,11 @@ public:
     bool prepareStatements(std::initializer_list<PreparedStatement> statements, const char *function);
     // Binds one list per position and runs the batch, unless the first list is
     // empty; a failure rolls back with the report.
+    // SQLite takes a leading U+FEFF of a bound string for a byte order mark and
+    // drops it; a name that starts with one is bound with one more, so that it
+    // is stored, and found, as it is on disk.
+    static QVariant text(const QString &value);
+
     bool execBatch(QSqlQuery &query, const QList<QVariantList> &columns, const char *function,
                    const char *failure);
     // The same for a statement whose lists are bound already.

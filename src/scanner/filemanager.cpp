@@ -395,7 +395,7 @@ bool FileManager::readEvent()
         } else if (header.mask & ArrivedMask) {
             const QFileInfo info(path);
             m_fileIdQuery.bindValue(0, directory.id);
-            m_fileIdQuery.bindValue(1, name);
+            m_fileIdQuery.bindValue(1, text(name));
             if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
                 m_fileIdQuery.finish();
                 updateTimes << modificationTime(info);
@@ -621,12 +621,12 @@ qint64 FileManager::insertFile(const QString &path)
     postUpdate();
 
     m_fileIdQuery.bindValue(0, directoryId);
-    m_fileIdQuery.bindValue(1, info.fileName());
+    m_fileIdQuery.bindValue(1, text(info.fileName()));
     const qint64 id = findOrInsert(m_fileIdQuery, "Failed to execute m_fileIdQuery.",
                                    m_fileInsert, "Failed to execute m_fileInsert.", [&]() {
         m_fileInsert.bindValue(0, directoryId);
         m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
-        m_fileInsert.bindValue(2, info.fileName());
+        m_fileInsert.bindValue(2, text(info.fileName()));
         m_fileInsert.bindValue(3, modificationTime(info));
     });
     if (id == 0)
