@@ -24,7 +24,7 @@ int ChangeMonitor::run()
     connect(m_client.proxy(), &ThemeletInterface::contentChanged, this, &ChangeMonitor::contentChanged);
     // Asked after subscribing: the bus handles our messages in order, so no
     // signal sent after this answer is missed.
-    if (!m_client.isRunning()) {
+    if (!m_client.ensureRunning()) {
         ContentPrinter::printError(m_client.errorString());
         return 1;
     }

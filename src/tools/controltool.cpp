@@ -151,7 +151,7 @@ int ControlTool::failure(const QString &message)
 
 bool ControlTool::serviceMissing()
 {
-    if (m_service.isRunning())
+    if (m_service.ensureRunning())
         return false;
     failure(m_service.errorString());
     return true;

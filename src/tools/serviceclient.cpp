@@ -53,6 +53,27 @@ bool ServiceClient::isRunning()
     return true;
 }
 
+bool ServiceClient::ensureRunning()
+{
+    if (isRunning())
+        return true;
+    QDBusConnectionInterface *bus = connection().interface();
+    if (!bus)
+        return false;
+    const QDBusReply<QStringList> activatable = bus->activatableServiceNames();
+    if (!activatable.isValid() || !activatable.value().contains(serviceName())) {
+        m_error += QStringLiteral("; start it with 'themeletd &' or install its D-Bus activation file");
+        return false;
+    }
+    const QDBusReply<void> started = bus->startService(serviceName());
+    if (!started.isValid()) {
+        m_error = QStringLiteral("themeletd could not be started by D-Bus activation: ")
+                + oneLine(started.error().message());
+        return false;
+    }
+    return isRunning();
+}
+
 uint ServiceClient::pid()
 {
     const QDBusConnection bus = connection();

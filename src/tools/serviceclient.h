@@ -16,6 +16,9 @@ public:
 
     // Asks the bus who owns the name; never starts the service by activation.
     bool isRunning();
+    // Whether the service is there, started by D-Bus activation if the bus
+    // knows how; otherwise the error says how to start it.
+    bool ensureRunning();
     // 0 when unknown.
     uint pid();
 

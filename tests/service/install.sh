@@ -33,8 +33,8 @@ CONF
 read -r DBUS_SESSION_BUS_ADDRESS bus < <(dbus-daemon --config-file="$work/bus.conf" --fork --print-address=1 --print-pid=1 | paste -s -d ' ')
 export DBUS_SESSION_BUS_ADDRESS
 trap 'kill "$bus"; [ -z "${service:-}" ] || kill "$service" 2>/dev/null || true' EXIT
-gdbus call --session --dest com.vorka.themeletd --object-path /com/vorka/themeletd \
-  --method org.freedesktop.DBus.Peer.Ping >/dev/null || fail "themeletd was not activated"
+# A command that needs the service starts it by activation.
+"$prefix/bin/themeletctl" refresh || fail "themeletctl refresh did not activate themeletd"
 service=$(gdbus call --session --dest org.freedesktop.DBus --object-path /org/freedesktop/DBus \
   --method org.freedesktop.DBus.GetConnectionUnixProcessID com.vorka.themeletd | sed 's/.* \([0-9]*\),)/\1/')
 [ "$(readlink "/proc/$service/exe")" = "$prefix/bin/themeletd" ] || fail "the bus started $(readlink "/proc/$service/exe")"

@@ -113,7 +113,8 @@ private slots:
         // Ids too, which would need the (missing) index to become URLs.
         for (const QStringList &command : { QStringList { "set", "12" }, { "create", "/x.jpg" }, { "install", "/x" }, { "index", "/x.jpg" },
                                             { "refresh" }, { "remove", "themelet", "/x.themelet" }, { "favorite", "1", "on" }, { "monitor" } })
-            row(command, 1, "^stderr: themeletctl: themeletd is not running \\(nobody owns com.vorka.themeletd on the session bus\\)\n$");
+            row(command, 1, "^stderr: themeletctl: themeletd is not running \\(nobody owns com.vorka.themeletd on the session bus\\); start it with 'themeletd &' "
+                               "or install its D-Bus activation file\n$");
         row({ "list", "photos" }, 1, "^stderr: themeletctl: no index at .*themeletd.sqlite \\(themeletd has not run yet\\)\n$");
         row({ "status" }, 1, "^service: +not running\ndatabase: +.*/themeletd.sqlite \\(missing\\)\nactive themelet: +none\nstderr: $");
         row({ "status", "--json" }, 1, R"(^\{\s*"activeThemelet": null,\s*"counts": \{\s*\},.*"exists": false,.*"running": false\s*\}\s*\}\n)");
