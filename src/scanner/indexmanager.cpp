@@ -2,16 +2,13 @@
 
 #include "content.h"
 #include "filemanager.h"
-#include "packagefile.h"
+#include "indexfile.h"
 #include "queryagentdatabase.h"
 #include "themelettranslator.h"
 
 #include <QDateTime>
 #include <QDebug>
 #include <QFileInfo>
-#include <QJsonArray>
-#include <QJsonDocument>
-#include <QJsonObject>
 #include <QVector>
 
 #include <algorithm>
@@ -118,21 +115,12 @@ bool IndexManager::updateMetaData()
     }
     m_modifiedReset.finish();
 
-    QByteArray content;
-    if (!PackageFile::read(indexPath, &content))
+    IndexFile index;
+    if (!index.read(indexPath))
         return true;
-
-    QJsonParseError error;
-    const QJsonDocument document = QJsonDocument::fromJson(content, &error);
-    if (document.isNull() || !document.isObject()) {
-        qWarning() << "Error parsing index from file" << indexPath << ", offset:" << error.offset
-                   << ", errorString:" << error.errorString();
-        return true;
-    }
-    const QJsonObject root = document.object();
 
     FileManager *files = FileManager::instance();
-    const QString directory = indexPath.left(indexPath.size() - 6);
+    const QString &directory = index.directory;
     const qint64 directoryId = files && !FileManager::isLinkedDirectory(directory)
             ? files->appendDirectory(directory, FileManager::IndexScope, FileManager::NoScan)
             : 0;
@@ -149,35 +137,23 @@ bool IndexManager::updateMetaData()
 
     // A null suffix: Qt's default, so the locale's catalogues end in ".qm".
     ThemeletTranslator translator{QString()};
-    translator.selectCatalog(PackageFile::text(root.value(QStringLiteral("translationCatalog"))));
+    translator.selectCatalog(index.translationCatalog);
 
     QVector<Entry> entries;
     QVector<QPair<QString, QString>> aliases;
-    const QJsonArray fileArray = root.value(QStringLiteral("files")).toArray();
-    for (const QJsonValue &value : fileArray) {
-        const QJsonObject object = value.toObject();
-        if (object.isEmpty())
-            continue;
-        const QString fileName = PackageFile::text(object.value(QStringLiteral("fileName")));
-        const QString path = PackageFile::regularFile(directory, fileName);
-        if (path.isEmpty())
-            continue;
-        const QFileInfo info(path);
+    for (const IndexFile::Entry &read : qAsConst(index.entries)) {
+        const QFileInfo info(read.path);
 
         Entry entry;
-        entry.name = fileName.toUtf8();
-        entry.path = path;
-        entry.fileName = fileName;
-        entry.displayName = translator.translate(PackageFile::text(object.value(QStringLiteral("displayName"))));
-        entry.category = PackageFile::text(object.value(QStringLiteral("category")));
+        entry.name = read.fileName.toUtf8();
+        entry.path = read.path;
+        entry.fileName = read.fileName;
+        entry.displayName = translator.translate(read.displayName);
+        entry.category = read.category;
         entry.modificationTime = modificationTime(info);
 
-        const QJsonArray aliasArray = object.value(QStringLiteral("aliases")).toArray();
-        for (const QJsonValue &alias : aliasArray) {
-            const QString oldName = PackageFile::text(alias);
-            if (!oldName.isEmpty())
-                aliases.append(qMakePair(oldName, fileName));
-        }
+        for (const QString &oldName : read.aliases)
+            aliases.append(qMakePair(oldName, read.fileName));
         entries.append(entry);
     }
 

@@ -32,14 +32,17 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
     if (document.isNull() || !document.isObject()) {
         qWarning() << "Failed to parse themelet file" << path << ", jsonError:" << int(error.error)
                    << ", jsonOffset:" << error.offset;
+        parseError = error.error == QJsonParseError::NoError ? QStringLiteral("not a JSON object") : error.errorString();
+        parseErrorOffset = error.error == QJsonParseError::NoError ? 0 : error.offset;
         return Malformed;
     }
     const QJsonObject object = document.object();
+    keys = object.keys();
 
     // Removing the themelet deletes its wallpaper: it has to be a file of the package.
     this->directory = directory;
-    wallpaperPath = PackageFile::fileInside(directory, QStringLiteral("images"),
-                                            PackageFile::text(object.value(QLatin1String("wallpaper"))));
+    wallpaper = PackageFile::text(object.value(QLatin1String("wallpaper")));
+    wallpaperPath = PackageFile::fileInside(directory, QStringLiteral("images"), wallpaper);
     if (wallpaperPath.isEmpty())
         return Invalid;
 
@@ -70,6 +73,19 @@ ThemeletFile::Status ThemeletFile::read(const QString &directory, const QString 
         tones[i].enabled = tone.value(QLatin1String("enabled")).toInt(1);
     }
     return Valid;
+}
+
+QStringList ThemeletFile::knownKeys()
+{
+    QStringList known { QStringLiteral("wallpaper"), QStringLiteral("translationCatalog"),
+                        QStringLiteral("favorite"), QStringLiteral("displayName"),
+                        QStringLiteral("highlightColor"), QStringLiteral("secondaryHighlightColor"),
+                        QStringLiteral("primaryColor"), QStringLiteral("secondaryColors"),
+                        QStringLiteral("ringerVolume"), QStringLiteral("partnerSpace"),
+                        QStringLiteral("timestamp"), QStringLiteral("version") };
+    for (const QString &tone : ThemeletTones::keys())
+        known << tone + QLatin1String("File");
+    return known;
 }
 
 int ThemeletFile::enabledSounds() const

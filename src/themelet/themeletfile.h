@@ -29,10 +29,20 @@ public:
     // `batchTime` stands in for a missing or unparsable "timestamp".
     Status read(const QString &directory, const QString &fileName, const QString &batchTime);
 
+    // The keys a file may have; others are ignored.
+    static QStringList knownKeys();
+
     // All bits set but those of tones that say "enabled": 0.
     int enabledSounds() const;
     // The file a tone refers to: its own sound, the system's fallback, or none.
     QString tonePath(int tone, const QString &fallback) const;
+
+    // Why a file is Malformed: the parser's error and its byte offset.
+    QString parseError;
+    int parseErrorOffset = -1;
+    // The file's keys and its "wallpaper" as written, for diagnostics.
+    QStringList keys;
+    QString wallpaper;
 
     QString directory;
     QString wallpaperPath;

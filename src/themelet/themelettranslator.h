@@ -21,6 +21,8 @@ public:
 
     // The locale's translation, else the engineering one, else the text itself.
     QString translate(const QString &text) const;
+    // Whether the selected catalogue was found, in either form.
+    bool isLoaded() const { return m_loaded; }
 
 private:
     QTranslator m_localeTranslator;

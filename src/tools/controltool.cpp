@@ -1,6 +1,7 @@
 #include "controltool.h"
 
 #include "changemonitor.h"
+#include "packagechecker.h"
 #include "themeletinterface.h"
 #include "themeletsettings.h"
 
@@ -34,6 +35,8 @@ const ControlTool::Command ControlTool::s_commands[] = {
     { "monitor", "", 0, "print each contentChanged of the service until it stops",
       &ControlTool::monitor },
     { "status", "", 0, "service, index file, schema version and row counts", &ControlTool::status },
+    { "check", "PATH", 1, "check a package directory, .themelet or .index file before shipping it",
+      &ControlTool::check },
 };
 
 namespace {
@@ -85,12 +88,12 @@ QString ControlTool::helpText()
     text += QStringLiteral(
             "\nAn ID is a content id; a URL may be given as a path.\n\n"
             "Options:\n"
-            "  --json         print JSON (list, show, set, create, monitor, status)\n"
+            "  --json         print JSON (list, show, set, create, monitor, status, check)\n"
             "  -v, --verbose  show the engine's log\n"
             "  -h, --help     this text\n"
             "  --version      the version\n\n"
             "Exit status: 0 success, 1 failure (the service's message on stderr; status:\n"
-            "also when themeletd is not running), 2 usage error.");
+            "also when themeletd is not running; check: a problem found), 2 usage error.");
     return text;
 }
 
@@ -453,4 +456,29 @@ int ControlTool::status(const QStringList &)
         ContentPrinter::printTable(table);
     }
     return running && readable ? Success : Failure;
+}
+
+int ControlTool::check(const QStringList &arguments)
+{
+    PackageChecker checker;
+    checker.check(arguments.first());
+    const QVector<PackageChecker::Problem> problems = checker.problems();
+    if (m_json) {
+        QJsonArray list;
+        for (const PackageChecker::Problem &problem : problems) {
+            list.append(QJsonObject { { QStringLiteral("file"), problem.file },
+                                      { QStringLiteral("field"), problem.field },
+                                      { QStringLiteral("problem"), problem.message } });
+        }
+        ContentPrinter::printJson(list);
+    } else {
+        for (const PackageChecker::Problem &problem : problems) {
+            ContentPrinter::print(ContentPrinter::oneLine(problem.file + QLatin1String(": ")
+                                  + (problem.field.isEmpty() ? QString() : problem.field + QLatin1String(": "))
+                                  + problem.message));
+        }
+        if (problems.isEmpty())
+            ContentPrinter::print(arguments.first() + QLatin1String(": no problems found"));
+    }
+    return problems.isEmpty() ? Success : Failure;
 }

@@ -35,6 +35,7 @@ private:
     int remove(const QStringList &arguments);
     int monitor(const QStringList &arguments);
     int status(const QStringList &arguments);
+    int check(const QStringList &arguments);
 
     int usageError(const QString &message);
     int failure(const QString &message);

@@ -96,6 +96,15 @@ private slots:
         QVERIFY(QDir().mkpath(sandbox() + "/extra/images") && writeJpeg(sandbox() + "/extra/images/extra.jpg"));
         for (int i = 1; i <= 3; ++i)
             QVERIFY(writeJpeg(pictures() + QStringLiteral("/photo%1.jpg").arg(i), { QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(4 - i) }));
+        // A package with one fault of each kind, for check.
+        const QString bad = sandbox() + "/bad";
+        QVERIFY(write(bad + "/a.themelet", R"({"wallpaper": "../x.jpg", "colour": "red"})"));
+        QVERIFY(write(bad + "/b.themelet", "{\n \"wallpaper\": \"w.jpg\",\n oops\n}"));
+        QVERIFY(write(bad + "/c.themelet", R"({"wallpaper": "w.jpg", "messageToneFile": {"file": "gone.ogg"}, "translationCatalog": "nocat"})"));
+        QVERIFY(QDir().mkpath(bad + "/images") && writeJpeg(bad + "/images/w.jpg") && write(bad + "/t/t.ogg", "OggS"));
+        QVERIFY(write(bad + "/t.index", R"({"files": [{"fileName": "t.ogg"}, {"fileName": "../etc"}, 3, {"fileName": "gone.ogg"}]})"));
+        QVERIFY(write(bad + "/huge.index", QByteArray(4 * 1024 * 1024 + 1, ' ')));
+        QVERIFY(QDir().mkpath(sandbox() + "/empty"));
     }
 
     void withoutService_data()
@@ -116,6 +125,22 @@ private slots:
             row(command, 1, "^stderr: themeletctl: themeletd is not running \\(nobody owns com.vorka.themeletd on the session bus\\); start it with 'themeletd &' "
                                "or install its D-Bus activation file\n$");
         row({ "list", "photos" }, 1, "^stderr: themeletctl: no index at .*themeletd.sqlite \\(themeletd has not run yet\\)\n$");
+        // check reads as the engine reads, with no service.
+        row({ "check", package() }, 0, "^.*: no problems found\nstderr: $");
+        const QString bad = "/bad/";
+        row({ "check", sandbox() + "/bad" }, 1, "^[^\\n]*" + QStringList {
+                bad + "a.themelet: colour: unknown key; ignored",
+                bad + "a.themelet: wallpaper: '../x.jpg' leaves .*/bad/images: only a plain file name is allowed",
+                bad + "b.themelet: invalid JSON at line 3, column 3: unterminated object; the file is not read",
+                bad + "c.themelet: messageToneFile.file: no file 'gone.ogg' in .*/bad/sounds",
+                bad + "c.themelet: translationCatalog: no catalogue nocat_eng_en.qm or nocat-<locale> in .*",
+                bad + "huge.index: 4194305 bytes: larger than the 4194304 bytes a package file may have; not read",
+                bad + "t.index: files\\[1\\].fileName: '../etc' is not a plain file name in .*/bad/t; ignored",
+                bad + "t.index: files\\[2\\]: not an object with at least one key; ignored",
+                bad + "t.index: files\\[3\\].fileName: no file 'gone.ogg' in .*/bad/t; ignored" }.join("\n[^\n]*") + "\nstderr: $");
+        row({ "check", "--json", sandbox() + "/bad/b.themelet" }, 1, "^\\[\\s*.\\s*\"field\": \"\",\\s*\"file\": \".*/b.themelet\",\\s*\"problem\": \"invalid JSON");
+        row({ "check", sandbox() + "/empty" }, 1, "nothing installable: no .themelet or .index file in it\nstderr: $");
+        row({ "check" }, 2, "usage: themeletctl check PATH");
         row({ "status" }, 1, "^service: +not running\ndatabase: +.*/themeletd.sqlite \\(missing\\)\nactive themelet: +none\nstderr: $");
         row({ "status", "--json" }, 1, R"(^\{\s*"activeThemelet": null,\s*"counts": \{\s*\},.*"exists": false,.*"running": false\s*\}\s*\}\n)");
     }
