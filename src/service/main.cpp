@@ -67,16 +67,33 @@ int main(int argc, char *argv[])
     QCommandLineParser parser;
     parser.setApplicationDescription(QStringLiteral(
             "Keeps the index of pictures, tones and themelets and serves it on the session bus as com.vorka.themeletd."));
-    parser.addHelpOption();
-    parser.addVersionOption();
+    // As in themeletctl: -v is --verbose, and the version has no short form.
+    const QCommandLineOption help(QStringList { QStringLiteral("h"), QStringLiteral("help") },
+                                  QStringLiteral("Displays this help."));
+    const QCommandLineOption version(QStringLiteral("version"), QStringLiteral("Displays version information."));
     const QCommandLineOption watch(QStringLiteral("watch"),
                                    QStringLiteral("Index and follow this directory (may be given more than once)."),
                                    QStringLiteral("DIR"));
     const QCommandLineOption noDefaultWatch(QStringLiteral("no-default-watch"),
                                             QStringLiteral("Do not index the user's Pictures and Music directories."));
-    const QCommandLineOption verbose(QStringLiteral("verbose"), QStringLiteral("Log every call and step."));
-    parser.addOptions({ watch, noDefaultWatch, verbose });
-    parser.process(app);
+    const QCommandLineOption verbose(QStringList { QStringLiteral("v"), QStringLiteral("verbose") },
+                                     QStringLiteral("Log every call and step."));
+    parser.addOptions({ watch, noDefaultWatch, verbose, help, version });
+    if (!parser.parse(app.arguments()) || !parser.positionalArguments().isEmpty()) {
+        const QString error = parser.positionalArguments().isEmpty()
+                ? parser.errorText()
+                : QStringLiteral("unexpected argument '%1'").arg(parser.positionalArguments().constFirst());
+        std::fprintf(stderr, "themeletd: %s\nthemeletd: try 'themeletd --help'\n", qPrintable(error));
+        return 2;
+    }
+    if (parser.isSet(help)) {
+        std::fputs(qPrintable(parser.helpText()), stdout);
+        return 0;
+    }
+    if (parser.isSet(version)) {
+        std::printf("themeletd %s\n", THEMELETD_VERSION);
+        return 0;
+    }
 
     if (!parser.isSet(verbose))
         QLoggingCategory::setFilterRules(QStringLiteral("*.debug=false"));

@@ -26,6 +26,13 @@
 
 namespace {
 
+// For messages: the names clients use for content types.
+QString typeName(int type)
+{
+    static const char *const s_names[] = { "file", "themelet", "photo", "video", "download" };
+    return type >= 0 && type < int(std::size(s_names)) ? QLatin1String(s_names[type]) : QString::number(type);
+}
+
 // Bigger pictures are refused: the copy would hold the bus longer than a step.
 const qint64 MaxPictureSize = 64 * 1024 * 1024;
 const int MaxMessageLength = 300;
@@ -231,7 +238,7 @@ bool ThemeletService::findContent(int contentType, qint64 id, FileRow *row)
     }
     m_fileQuery.finish();
     if (!row->found || (contentType == ThemeletContent::Themelet && !row->themelet))
-        return fail(NotFound, QStringLiteral("No content of type %1 with id %2").arg(contentType).arg(id));
+        return fail(NotFound, QStringLiteral("No %1 with id %2").arg(typeName(contentType)).arg(id));
     return true;
 }
 
@@ -530,7 +537,11 @@ bool ThemeletService::removeContent(ContentManager *manager, int contentType, qi
         active = !current.isNull() && current->id == contentId;
     }
     if (!manager->remove(contentId))
-        return fail(Failed, QStringLiteral("Content %1 of type %2 cannot be removed").arg(contentId).arg(contentType));
+        return fail(Failed, QStringLiteral("Content %1 of type %2 cannot be removed%3")
+                                    .arg(contentId)
+                                    .arg(typeName(contentType),
+                                         contentType == ThemeletContent::Themelet ? QString()
+                                                                                  : QStringLiteral(": delete the file itself")));
     if (active)
         leaveThemelet();
     return true;

@@ -30,7 +30,7 @@ const ControlTool::Command ControlTool::s_commands[] = {
     { "install", "DIR", 1, "install the package in a directory", &ControlTool::install },
     { "index", "FILE", 1, "have one file indexed", &ControlTool::index },
     { "refresh", "", 0, "rescan the installed themelets", &ControlTool::refresh },
-    { "remove", "TYPE ID|URL", 2, "delete an item; TYPE is file, themelet, photo or a number",
+    { "remove", "TYPE ID|URL", 2, "delete an item; TYPE is themelet or download",
       &ControlTool::remove },
     { "monitor", "", 0, "print each contentChanged of the service until it stops",
       &ControlTool::monitor },
@@ -382,9 +382,14 @@ int ControlTool::refresh(const QStringList &)
 int ControlTool::remove(const QStringList &arguments)
 {
     const int type = ContentPrinter::typeFromName(arguments.first());
-    if (type < 0) {
+    if (type == ThemeletContent::File || type == ThemeletContent::Photo || type == ThemeletContent::Video) {
+        // The service keeps the index of such files; it never deletes them.
+        return usageError(QStringLiteral("a ") + ContentPrinter::typeName(type)
+                          + QStringLiteral(" can't be removed through themeletd: delete the file itself"));
+    }
+    if (type != ThemeletContent::Themelet && type != ThemeletContent::Download) {
         return usageError(QStringLiteral("unknown content type '") + arguments.first()
-                          + QStringLiteral("': file, themelet, photo, video, download or a number"));
+                          + QStringLiteral("': themelet or download"));
     }
     qint64 id = 0;
     if (serviceMissing())

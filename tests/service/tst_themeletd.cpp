@@ -274,6 +274,7 @@ private slots:
         QTest::newRow("unknown id") << "saveAttributes" << QVariantList { 1, qlonglong(999999), QVariantMap() } << notFound;
         QTest::newRow("file is no themelet") << "remove" << QVariantList { 1, toneId } << notFound;
         QTest::newRow("package themelet") << "remove" << QVariantList { 1, m_sunsetId } << "ReadOnly";
+        QTest::newRow("plain file") << "remove" << QVariantList { 0, toneId } << "Failed";
         QTest::newRow("bad colour") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "highlightColor", "reddish" } }) } << invalid;
         QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "ringerVolume", 1000 } }) } << invalid;
         QTest::newRow("unknown key") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "shadowColor", "#ff000000" } }) } << invalid;
@@ -303,6 +304,8 @@ private slots:
         const QDBusMessage answer = Service::call(method, arguments);
         QCOMPARE(answer.errorName(), "com.vorka.themeletd.Error." + error);
         QVERIFY(!answer.errorMessage().isEmpty() && !answer.errorMessage().contains('\n'));
+        // Known types are named, not numbered.
+        QVERIFY2(error == "InvalidArgs" || !answer.errorMessage().contains(QRegularExpression("type \\d")), qPrintable(answer.errorMessage()));
         // A refused write of a known type makes the clients show the stored values again.
         const int type = arguments.value(0).toInt();
         if ((method == "saveAttributes" || method == "remove") && type >= 0 && type <= 4 && type != 3)
@@ -320,6 +323,11 @@ private slots:
         QCOMPARE(second.readAllStandardError(),
                  QByteArray("themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n"));
         QCOMPARE(QFileInfo(TestDatabase::indexPath()).lastModified(), modified);
+        // A usage error, as in themeletctl: exit status 2, one line and a hint.
+        second.start(THEMELETD_BINARY, { "-v", "--frob" });
+        QVERIFY(second.waitForFinished(20000));
+        QCOMPARE(second.exitCode(), 2);
+        QCOMPARE(second.readAllStandardError(), QByteArray("themeletd: Unknown option 'frob'.\nthemeletd: try 'themeletd --help'\n"));
     }
 
     void stopAndRestart()

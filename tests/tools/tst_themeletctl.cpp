@@ -118,7 +118,8 @@ private slots:
         row({ "set", "a", "b" }, 2, "^stderr: themeletctl: usage: themeletctl set ID\\|URL" + tryHelp);
         row({ "list", "tunes" }, 2, "^stderr: themeletctl: list what\\? themelets, photos or tones" + tryHelp);
         row({ "favorite", "1", "maybe" }, 2, "on or off, not 'maybe'" + tryHelp);
-        row({ "remove", "sock", "1" }, 2, "unknown content type 'sock': file, themelet, photo, video, download or a number" + tryHelp);
+        row({ "remove", "sock", "1" }, 2, "unknown content type 'sock': themelet or download" + tryHelp);
+        row({ "remove", "2", "1" }, 2, "a photo can't be removed through themeletd: delete the file itself" + tryHelp);
         // Ids too, which would need the (missing) index to become URLs.
         for (const QStringList &command : { QStringList { "set", "12" }, { "create", "/x.jpg" }, { "install", "/x" }, { "index", "/x.jpg" },
                                             { "refresh" }, { "remove", "themelet", "/x.themelet" }, { "favorite", "1", "on" }, { "monitor" } })
@@ -234,8 +235,7 @@ private slots:
         row({ "show", "--json", S + "/elsewhere/new.jpg" }, 0, R"("type": "photo",.*"width": 64)");
         row({ "remove", "themelet", created }, 0, none);
         row({ "show", created }, 1, "^stderr: themeletctl: not in the index: ");
-        row({ "remove", "file", S + "/elsewhere/new.jpg" }, 1, "^stderr: themeletctl: Content \\d+ of type 0 cannot be removed\n$");
-        row({ "remove", "99", "1" }, 1, "^stderr: themeletctl: Unknown content type 99\n$");
+        row({ "remove", "file", S + "/elsewhere/new.jpg" }, 2, "^stderr: themeletctl: a file can't be removed through themeletd: delete the file itself\n");
         row({ "install", S + "/extra" }, 0, none);
         row({ "show", "--json", S + "/extra/extra.themelet" }, 0, "\"displayName\": \"Extra\"");
         row({ "refresh" }, 0, none);
