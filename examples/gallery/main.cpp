@@ -179,10 +179,7 @@ private:
 
 int main(int argc, char *argv[])
 {
-    QCoreApplication::setAttribute(Qt::AA_EnableHighDpiScaling);
-    QGuiApplication app(argc, argv);
-    app.setApplicationName(QStringLiteral("themelet-gallery"));
-
+    QCoreApplication::setApplicationName(QStringLiteral("themelet-gallery"));
     QCommandLineParser parser;
     parser.setApplicationDescription(QStringLiteral("Themelets, photos and tones of the content index."));
     parser.addHelpOption();
@@ -194,17 +191,35 @@ int main(int argc, char *argv[])
     const QCommandLineOption size("size", "Window size, e.g. 540x960 (default 1280x800).", "WxH", "1280x800");
     const QCommandLineOption importPath("import-path", "Also look for QML modules in <dir>.", "dir");
     parser.addOptions({ screenshot, tap, create, switchSounds, timeout, size, importPath });
-    parser.process(app);
+    // Parsed before the application exists, so that --help and usage errors need no display.
+    QStringList arguments;
+    for (int i = 0; i < argc; ++i)
+        arguments << QString::fromLocal8Bit(argv[i]);
+    const auto usageError = [](const QString &message) {
+        print(QStringLiteral("themelet-gallery: ") + message, stderr);
+        print(QStringLiteral("themelet-gallery: try 'themelet-gallery --help'"), stderr);
+        return 2;
+    };
+    if (!parser.parse(arguments))
+        return usageError(parser.errorText());
+    if (parser.isSet(QStringLiteral("help"))) {
+        const QCoreApplication core(argc, argv); // the help names the program from it
+        std::fputs(qPrintable(parser.helpText()), stdout);
+        return 0;
+    }
 
     const QStringList dimensions = parser.value(size).split('x');
     const QSize windowSize(dimensions.value(0).toInt(), dimensions.value(1).toInt());
     if (windowSize.width() <= 0 || windowSize.height() <= 0)
-        parser.showHelp(2);
+        return usageError(QStringLiteral("--size takes WxH, e.g. 540x960"));
     // At most a day, so that the milliseconds fit in an int.
     bool timeoutValid = false;
     const int timeoutSeconds = parser.value(timeout).toInt(&timeoutValid);
     if (!timeoutValid || timeoutSeconds <= 0 || timeoutSeconds > 24 * 3600)
-        parser.showHelp(2);
+        return usageError(QStringLiteral("--timeout takes a number of seconds from 1 to 86400"));
+
+    QCoreApplication::setAttribute(Qt::AA_EnableHighDpiScaling);
+    QGuiApplication app(argc, argv);
 
     QQmlApplicationEngine engine;
     if (QDir(THEMELET_BUILD_QML_DIR).exists())

@@ -22,6 +22,10 @@ gdbus wait --session --timeout 60 com.vorka.themeletd || { cat "$work/themeletd.
 # Screenshots need a real X server and the default scene graph backend.
 unset QT_QPA_PLATFORM QT_QUICK_BACKEND
 
+# Help and usage errors need no display at all.
+(unset DISPLAY; "$bin/themelet-gallery" --help | grep -- '--screenshot' >/dev/null) || fail "--help without a display"
+(unset DISPLAY; "$bin/themelet-gallery" --size x >/dev/null 2>&1; [ $? = 2 ]) || fail "a usage error does not exit 2"
+
 # gallery NAME ARGS...: runs the gallery, its output in $work/NAME.out.
 gallery() {
   local name=$1; shift
