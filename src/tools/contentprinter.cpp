@@ -14,6 +14,7 @@ namespace {
 
 const char *const s_typeNames[] = { "file", "themelet", "photo", "video", "download" };
 const int s_typeCount = int(sizeof(s_typeNames) / sizeof(s_typeNames[0]));
+bool s_jsonErrors = false;
 
 void write(FILE *stream, const QString &text)
 {
@@ -192,7 +193,21 @@ void ContentPrinter::print(const QString &line)
     write(stdout, line + QLatin1Char('\n'));
 }
 
-void ContentPrinter::printError(const QString &line)
+void ContentPrinter::printError(const QString &line, const QString &hint)
 {
+    if (s_jsonErrors) {
+        QJsonObject error { { QStringLiteral("error"), line } };
+        if (!hint.isEmpty())
+            error.insert(QStringLiteral("hint"), hint);
+        write(stderr, QString::fromUtf8(QJsonDocument(error).toJson(QJsonDocument::Compact)) + QLatin1Char('\n'));
+        return;
+    }
     write(stderr, QStringLiteral("themeletctl: ") + line + QLatin1Char('\n'));
+    if (!hint.isEmpty())
+        write(stderr, QStringLiteral("themeletctl: ") + hint + QLatin1Char('\n'));
+}
+
+void ContentPrinter::setJsonErrors(bool json)
+{
+    s_jsonErrors = json;
 }

@@ -42,7 +42,9 @@ public:
 
     static void print(const QString &line);
     // To stderr, as "themeletctl: line".
-    static void printError(const QString &line);
+    static void printError(const QString &line, const QString &hint = QString());
+    // Errors as one JSON object a line, {"error": ..., "hint": ...}, for --json.
+    static void setJsonErrors(bool json);
 };
 
 #endif

@@ -112,6 +112,7 @@ int ControlTool::run(const QStringList &arguments)
     if (!s_defaultHandler)
         s_defaultHandler = qInstallMessageHandler(filterMessages);
     m_json = parser.isSet(jsonOption);
+    ContentPrinter::setJsonErrors(m_json);
 
     if (parser.isSet(helpOption)) {
         ContentPrinter::print(helpText());
@@ -141,8 +142,7 @@ int ControlTool::run(const QStringList &arguments)
 
 int ControlTool::usageError(const QString &message)
 {
-    ContentPrinter::printError(message);
-    ContentPrinter::printError(QStringLiteral("try 'themeletctl --help'"));
+    ContentPrinter::printError(message, QStringLiteral("try 'themeletctl --help'"));
     return UsageError;
 }
 
@@ -281,7 +281,8 @@ int ControlTool::list(const QStringList &arguments)
             const auto *data = static_cast<const FileData *>(row.data());
             table.append({ QString::number(data->id),
                            data->category.isEmpty() ? QStringLiteral("-") : data->category,
-                           data->displayName, data->url.toLocalFile() });
+                           data->displayName.isEmpty() ? data->fileName : data->displayName,
+                           data->url.toLocalFile() });
         }
         break;
     }

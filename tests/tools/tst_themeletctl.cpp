@@ -118,6 +118,8 @@ private slots:
         row({ "set", "a", "b" }, 2, "^stderr: themeletctl: usage: themeletctl set ID\\|URL" + tryHelp);
         row({ "list", "tunes" }, 2, "^stderr: themeletctl: list what\\? themelets, photos or tones" + tryHelp);
         row({ "favorite", "1", "maybe" }, 2, "on or off, not 'maybe'" + tryHelp);
+        row({ "--json", "frob" }, 2, "^stderr: \\{\"error\":\"unknown command 'frob'\",\"hint\":\"try 'themeletctl --help'\"\\}\n$");
+        row({ "--json", "refresh" }, 1, "^stderr: \\{\"error\":\"themeletd is not running .*\"\\}\n$");
         row({ "remove", "sock", "1" }, 2, "unknown content type 'sock': themelet or download" + tryHelp);
         row({ "remove", "2", "1" }, 2, "a photo can't be removed through themeletd: delete the file itself" + tryHelp);
         // Ids too, which would need the (missing) index to become URLs.
@@ -208,7 +210,7 @@ private slots:
                     + "\",.*\"wallpaperUrl\": \"file://" + P + "/images/sunset.jpg\",[^{}]*\\}\\s*\\]\n");
         row({ "list", "photos" }, 0, "^ID +TAKEN +SIZE +PATH\n\\d+ +2014-05-01T12:00:00 +64x48 +" + H + "/photo3.jpg\n.*photo2.*\n.*photo1");
         row({ "list", "photos", "--json" }, 0, R"("dateTaken": "2014-05-01T12:00:00",.*"fileName": "photo3.jpg",.*"height": 48,.*"mimeType": "image/jpeg",.*"type": "photo",.*"width": 64.*photo2.*photo1)");
-        row({ "list", "tones" }, 0, "^ID +CATEGORY +NAME +PATH\n\\d+ +Ringtone +Alarm +.*/alarm.ogg\n\\d+ +Default +Bell .*\n\\d+ +- .*/dusk.ogg\nstderr: $");
+        row({ "list", "tones" }, 0, "^ID +CATEGORY +NAME +PATH\n\\d+ +Ringtone +Alarm +.*/alarm.ogg\n\\d+ +Default +Bell .*\n\\d+ +- +dusk.ogg +.*/dusk.ogg\nstderr: $");
         row({ "show", sunset }, 0, "^type: themelet\ncontentId: " + m_id + "\n.*\ndisplayName: Sunset\n.*\nresources.ringerToneFile.url: " + P
                     + "/sounds/dusk.ogg\n.*\nactive: false\nstderr: $");
         row({ "show", "--json", "file://" + tones() + "/tones/bell.ogg" }, 0, R"("category": "Default",.*"displayName": "Bell",.*"readOnly": true,.*"type": "file")");
@@ -263,7 +265,8 @@ private slots:
         for (QProcess *monitor : { &text, &json }) {
             QVERIFY(monitor->waitForFinished(20000));
             QCOMPARE(monitor->exitCode(), 1);
-            QCOMPARE(QString::fromUtf8(monitor->readAllStandardError()), "themeletctl: themeletd left the session bus\n");
+            QCOMPARE(QString::fromUtf8(monitor->readAllStandardError()),
+                     monitor == &text ? "themeletctl: themeletd left the session bus\n" : R"({"error":"themeletd left the session bus"})" "\n");
         }
         const QPair<int, QString> status = ctl({ "status", "--json" });
         QCOMPARE(status.first, 1);
