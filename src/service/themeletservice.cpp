@@ -139,16 +139,56 @@ void ThemeletService::start(const QStringList &watchedDirectories)
     convergeActiveThemelet();
     new WalTrimmer(DbManager::instance(), MaxLogSize, 1000, this);
 
+    // The watched trees first: an install path inside one is nested in it
+    // before anything is scanned (the scans run from the event loop).
+    QStringList roots;
+    for (const QString &path : watchedDirectories) {
+        const QString root = QDir::cleanPath(QDir::current().absoluteFilePath(path));
+        if (files->appendDirectory(root, FileManager::UserScope, FileManager::ScanNew) == 0) {
+            qWarning().noquote() << "themeletd: cannot watch" << path;
+        } else {
+            qDebug().noquote() << "themeletd: watching" << path;
+            roots << root;
+        }
+    }
+    nestInstallPaths(roots);
     for (const QString &path : InstallManager::installPaths())
         installer->appendDirectory(path);
-    for (const QString &path : watchedDirectories) {
-        if (files->appendDirectory(QDir::cleanPath(QDir::current().absoluteFilePath(path)),
-                                   FileManager::UserScope, FileManager::ScanNew) == 0)
-            qWarning().noquote() << "themeletd: cannot watch" << path;
-        else
-            qDebug().noquote() << "themeletd: watching" << path;
-    }
     m_started = true;
+}
+
+// A scan never adopts a directory that is already a root of its own: finding
+// one below it, it fails for good. So an install path inside a watched tree,
+// and the directories between them, are given their rows as children of the
+// tree before either is scanned; each keeps its own scope.
+void ThemeletService::nestInstallPaths(const QStringList &roots)
+{
+    FileManager *files = FileManager::instance();
+    QSqlQuery adopt(DbManager::instance());
+    adopt.prepare(QStringLiteral("UPDATE directory SET parentId = ? WHERE id = ? AND parentId IS NULL;"));
+    for (const QString &root : roots) {
+        for (const QString &installPath : InstallManager::installPaths()) {
+            const QString install = QDir::cleanPath(installPath);
+            if (!install.startsWith(root + QLatin1Char('/')) || !QFileInfo(install).isDir()
+                || FileManager::isLinkedDirectory(install))
+                continue;
+            qint64 parentId = files->appendDirectory(root, FileManager::UserScope, FileManager::NoScan);
+            QString path = root;
+            const QStringList steps = install.mid(root.size() + 1).split(QLatin1Char('/'));
+            for (const QString &step : steps) {
+                path += QLatin1Char('/') + step;
+                const qint64 id = files->appendDirectory(
+                        path, path == install ? FileManager::InstallScope : FileManager::UserScope, FileManager::NoScan);
+                if (parentId == 0 || id == 0)
+                    break;
+                adopt.bindValue(0, parentId);
+                adopt.bindValue(1, id);
+                if (!adopt.exec())
+                    qWarning() << "themeletd: cannot nest" << path << "in" << root << adopt.lastError();
+                parentId = id;
+            }
+        }
+    }
 }
 
 void ThemeletService::stop()

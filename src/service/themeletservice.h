@@ -69,6 +69,7 @@ private:
     void applyThemelet(const Themelet &themelet);
     void leaveThemelet();
     void convergeActiveThemelet();
+    void nestInstallPaths(const QStringList &roots);
     Themelet activeThemelet();
     QString copyToWallpapers(const QString &path);
 

@@ -91,7 +91,9 @@ private slots:
         // A first index half-made by a killed start is thrown away, never used.
         const QString halfMade = TestDatabase::indexPath() + ".new";
         QVERIFY(write(halfMade, "SQLite format 3"));
-        QVERIFY(Service::start(m_service, { m_watched }));
+        // A watched tree that holds the install paths is indexed whole; they keep their scopes.
+        QVERIFY(write(Sysroot::path("/usr/share/doc/readme.txt"), "x"));
+        QVERIFY(Service::start(m_service, { m_watched, Sysroot::path("/usr/share") }));
         QVERIFY(!QFile::exists(halfMade));
         QVERIFY(QDBusConnection::sessionBus().connect(Service::Name, Service::Path, Service::Name, "contentChanged", this,
                                                       SLOT(recordChange(int))));
@@ -191,6 +193,10 @@ private slots:
         QVERIFY(m_signals.contains(2));
         // A .themelet file a user drops in gets its type from the MIME package.
         QCOMPARE(query("SELECT mimeType FROM file WHERE fileName = 'notes.themelet'"), QString("application/x-vorka-themelet"));
+        QTRY_COMPARE(query("SELECT permissions FROM file WHERE fileName = 'readme.txt'"), QString("3"));
+        QCOMPARE(query("SELECT scope FROM directory WHERE path = '" + m_package + "' OR path = '" + Sysroot::path("/usr/share/themelet")
+                       + "' ORDER BY length(path)"), QString("1;2"));
+        QCOMPARE(query("SELECT permissions FROM file WHERE id = " + QString::number(m_sunsetId)), QString("1"));
     }
 
     void createAndSet()
