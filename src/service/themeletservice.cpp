@@ -13,6 +13,7 @@
 #include "waltrimmer.h"
 #include "wallpaperpalette.h"
 
+#include <QDBusConnection>
 #include <QDebug>
 #include <QDir>
 #include <QFileInfo>
@@ -98,6 +99,7 @@ ThemeletService::ThemeletService(QObject *parent)
     : QObject(parent)
 {
     connect(&m_notifier, &ChangeNotifier::contentChanged, this, &ThemeletService::contentChanged);
+    m_pictureReader.setMaxThreadCount(1); // one big picture in memory at a time
 }
 
 ThemeletService::~ThemeletService() = default;
@@ -208,7 +210,7 @@ void ThemeletService::stop()
     database.close();
 }
 
-bool ThemeletService::fail(Error error, const QString &message)
+bool ThemeletService::fail(Error error, const QString &message, const QDBusMessage *call)
 {
     static const char *const names[] = { "InvalidArgs", "NotFound", "ReadOnly", "Failed" };
     QString line = message.left(MaxMessageLength);
@@ -218,7 +220,9 @@ bool ThemeletService::fail(Error error, const QString &message)
     }
     const QString name = QLatin1String("com.vorka.themeletd.Error.") + QLatin1String(names[error]);
     qWarning().noquote() << name << line;
-    if (calledFromDBus())
+    if (call)
+        QDBusConnection::sessionBus().send(call->createErrorReply(name, line));
+    else if (calledFromDBus())
         sendErrorReply(name, line);
     return false;
 }
@@ -417,13 +421,41 @@ qlonglong ThemeletService::createThemelet(const QString &url)
         return fail(NotFound, QStringLiteral("No picture at '%1'").arg(path));
     if (!info.isFile() || !info.isReadable() || info.size() > MaxPictureSize)
         return fail(InvalidArgs, QStringLiteral("'%1' is no readable picture file of at most 64 MiB").arg(path));
-    const WallpaperPalette palette(WallpaperPalette::readThumbnail(path));
+    if (!calledFromDBus()) {
+        bool tooLarge = false;
+        const QImage thumbnail = WallpaperPalette::readThumbnail(path, &tooLarge);
+        return makeThemelet(path, thumbnail, tooLarge, nullptr);
+    }
+    // Decoding a big picture takes seconds: it is done off the loop, so that
+    // every other client is served meanwhile, and the reply follows.
+    setDelayedReply(true);
+    const QDBusMessage call = message();
+    m_pictureReader.start([this, path, call]() {
+        bool tooLarge = false;
+        const QImage thumbnail = WallpaperPalette::readThumbnail(path, &tooLarge);
+        QMetaObject::invokeMethod(this, [this, path, call, thumbnail, tooLarge]() {
+            const qlonglong id = makeThemelet(path, thumbnail, tooLarge, &call);
+            if (id != 0)
+                QDBusConnection::sessionBus().send(call.createReply(QVariant::fromValue(id)));
+        }, Qt::QueuedConnection);
+    });
+    return 0;
+}
+
+qlonglong ThemeletService::makeThemelet(const QString &path, const QImage &thumbnail, bool tooLarge,
+                                        const QDBusMessage *call)
+{
+    const QFileInfo info(path);
+    if (tooLarge)
+        return fail(InvalidArgs, QStringLiteral("'%1' has more pixels than %2 can be read at once")
+                                         .arg(path).arg(WallpaperPalette::MaxDecodedPixels), call);
+    const WallpaperPalette palette(thumbnail);
     if (!palette.isValid())
-        return fail(InvalidArgs, QStringLiteral("'%1' is not a picture").arg(path));
+        return fail(InvalidArgs, QStringLiteral("'%1' is not a picture").arg(path), call);
 
     const QString copy = copyToWallpapers(path);
     if (copy.isEmpty())
-        return fail(Failed, QStringLiteral("The picture could not be copied into %1").arg(ThemeletManager::wallpapersPath()));
+        return fail(Failed, QStringLiteral("The picture could not be copied into %1").arg(ThemeletManager::wallpapersPath()), call);
 
     ThemeletData *data = new ThemeletData(0, QUrl::fromLocalFile(copy));
     const Themelet themelet(data);
@@ -470,7 +502,7 @@ qlonglong ThemeletService::createThemelet(const QString &url)
     const qint64 id = manager->create(themelet);
     if (id == 0) {
         QFile::remove(copy);
-        return fail(Failed, QStringLiteral("The themelet of '%1' could not be stored").arg(path));
+        return fail(Failed, QStringLiteral("The themelet of '%1' could not be stored").arg(path), call);
     }
     if (!resources.isEmpty() && !manager->save(id, { { QStringLiteral("resources"), resources } }))
         qWarning() << "themeletd: the tones of themelet" << id << "could not be stored";

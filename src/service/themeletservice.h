@@ -7,6 +7,9 @@
 #include "themeletsettings.h"
 
 #include <QDBusContext>
+#include <QDBusMessage>
+#include <QImage>
+#include <QThreadPool>
 #include <QObject>
 #include <QSqlQuery>
 #include <QStringList>
@@ -58,7 +61,10 @@ private:
         QStringList pictures;
     };
 
-    bool fail(Error error, const QString &message);
+    // Logs and replies with the error: to `call` if given (a delayed reply), else
+    // to the D-Bus call being handled, if any.
+    bool fail(Error error, const QString &message, const QDBusMessage *call = nullptr);
+    qlonglong makeThemelet(const QString &path, const QImage &thumbnail, bool tooLarge, const QDBusMessage *call);
     QString localPath(const QString &url, const char *what);
     ContentManager *writableManager(int contentType);
     bool findContent(int contentType, qint64 id, FileRow *row);
@@ -83,6 +89,9 @@ private:
     QSqlQuery m_directoryQuery;
     QSqlQuery m_snapshotQuery;
     bool m_started = false;
+    // Pictures are read off the loop, one at a time; declared last, so that
+    // its destructor waits for a running read while the rest is still there.
+    QThreadPool m_pictureReader;
 };
 
 #endif

@@ -10,10 +10,18 @@ const qreal MinimumChroma = 0.2;
 
 }
 
-QImage WallpaperPalette::readThumbnail(const QString &path)
+QImage WallpaperPalette::readThumbnail(const QString &path, bool *tooLarge)
 {
     QImageReader reader(path);
     const QSize size = reader.size();
+    // Only JPEG decodes at a reduced scale (down to an eighth of each side);
+    // the other readers decode the whole picture and scale it afterwards.
+    const qint64 divisor = reader.format() == "jpeg" ? 64 : 1;
+    const bool large = size.isValid() && qint64(size.width()) * size.height() / divisor > MaxDecodedPixels;
+    if (tooLarge)
+        *tooLarge = large;
+    if (large)
+        return QImage();
     // Decoders such as JPEG scale while reading, which keeps big pictures cheap.
     if (size.isValid() && (size.width() > ThumbnailSize || size.height() > ThumbnailSize))
         reader.setScaledSize(size.scaled(ThumbnailSize, ThumbnailSize, Qt::KeepAspectRatio).expandedTo(QSize(1, 1)));

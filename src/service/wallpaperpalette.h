@@ -24,8 +24,12 @@ class WallpaperPalette
 public:
     explicit WallpaperPalette(const QImage &picture);
 
-    // A down-scaled reading of the picture at path; null when it can't be read.
-    static QImage readThumbnail(const QString &path);
+    // A down-scaled reading of the picture at path; null when it can't be read,
+    // or when decoding it would take more than MaxDecodedPixels (`tooLarge`).
+    static QImage readThumbnail(const QString &path, bool *tooLarge = nullptr);
+
+    // 128 MiB as 32-bit pixels: a decompression bomb is refused from its header.
+    static const qint64 MaxDecodedPixels = 32 * 1024 * 1024;
 
     bool isValid() const { return m_valid; }
     // -1 when the picture has no colour.
