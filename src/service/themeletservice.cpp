@@ -504,6 +504,13 @@ qlonglong ThemeletService::makeThemelet(const QString &path, const QImage &thumb
         QFile::remove(copy);
         return fail(Failed, QStringLiteral("The themelet of '%1' could not be stored").arg(path), call);
     }
+    // The copy is the themelet's picture, not one of the user's photos: marked
+    // read before the picture loop runs, it never gets an image row.
+    QSqlQuery read(DbManager::instance());
+    read.prepare(QStringLiteral("UPDATE file SET metadataCurrent = 1 WHERE id = ?;"));
+    read.bindValue(0, id);
+    if (!read.exec())
+        qWarning() << "themeletd: the copy of" << path << "stays in the photos:" << read.lastError();
     if (!resources.isEmpty() && !manager->save(id, { { QStringLiteral("resources"), resources } }))
         qWarning() << "themeletd: the tones of themelet" << id << "could not be stored";
     Content::signalChanged(ThemeletContent::Themelet);

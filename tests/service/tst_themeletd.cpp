@@ -241,6 +241,9 @@ private slots:
         QCOMPARE(query(columns.arg(second.value())), made.arg(wallpapers + "Blue Lagoon-2.png", "#ffe6e6e6|#ff969696|#ff000000|#a0000000"));
         settle();
         QCOMPARE(m_signals.count(1), 2);
+        // The copies are the themelets' pictures, not the user's photos.
+        QVERIFY(quiet());
+        QCOMPARE(query(QString("SELECT count(*) FROM image WHERE fileId IN (%1, %2)").arg(first.value()).arg(second.value())), QString("0"));
 
         // Its sounds are heard: the profile "themelet" becomes the active one, unless the user chose silence.
         const QString activeProfile = "/org/orbaline/themelet/profile";
