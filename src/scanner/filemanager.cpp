@@ -404,7 +404,7 @@ bool FileManager::readEvent()
             } else {
                 m_fileIdQuery.finish();
                 insertDirectories << directory.id;
-                insertTypes << m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name();
+                insertTypes << m_mimeTyper.typeOfFile(path);
                 insertNames << name;
                 insertTimes << modificationTime(info);
             }
@@ -489,7 +489,7 @@ bool FileManager::scanDirectory()
                 if (scope != UserScope)
                     return;
                 insertDirectories << id;
-                insertTypes << m_mimeDatabase.mimeTypeForFile(file.path, QMimeDatabase::MatchDefault).name();
+                insertTypes << m_mimeTyper.typeOfFile(file.path, true);
                 insertNames << file.fileName;
                 insertTimes << file.modified;
             },
@@ -625,7 +625,7 @@ qint64 FileManager::insertFile(const QString &path)
     const qint64 id = findOrInsert(m_fileIdQuery, "Failed to execute m_fileIdQuery.",
                                    m_fileInsert, "Failed to execute m_fileInsert.", [&]() {
         m_fileInsert.bindValue(0, directoryId);
-        m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
+        m_fileInsert.bindValue(1, m_mimeTyper.typeOfFile(info.filePath()));
         m_fileInsert.bindValue(2, info.fileName());
         m_fileInsert.bindValue(3, modificationTime(info));
     });

@@ -2,11 +2,11 @@
 #define FILEMANAGER_H
 
 #include "contentmanager.h"
+#include "mimetyper.h"
 #include "queryactor.h"
 
 #include <QElapsedTimer>
 #include <QHash>
-#include <QMimeDatabase>
 #include <QSocketNotifier>
 #include <QSqlQuery>
 #include <QStringList>
@@ -92,7 +92,7 @@ private:
     QStringList m_pendingDirectories;
     QHash<int, WatchedDirectory> m_watches;
     QList<ContentManager *> m_managers;
-    QMimeDatabase m_mimeDatabase;
+    MimeTyper m_mimeTyper;
     QElapsedTimer m_timer;
     int m_inotifyFd;
     bool m_initialized = false;

@@ -235,6 +235,43 @@ private slots:
         QVERIFY(pendingBytes(manager) > 0);
     }
 
+    // The types the scan and the events store are QMimeDatabase's, also for names that share
+    // an extension but not a type, names whose content decides and files that aren't regular.
+    void mimeTypes_data()
+    {
+        QTest::addColumn<QString>("disk");
+        QTest::addColumn<QString>("changes");
+        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >";
+        QTest::newRow("ogg: vorbis, opus, empty, text, png") << vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg"
+                                                   << vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; printf '\\211PNG\\r\\n\\032\\n' > p.ogg";
+        QTest::newRow("man pages and other globs") << "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ Makefile.am a.anim1"
+                                                   << "touch d.1 e.so.2 456.vdr";
+        QTest::newRow("no extension") << "echo text > plain; printf '\\211PNG\\r\\n\\032\\n' > png; : > empty" << "echo x > plain2; : > empty2";
+        QTest::newRow("case") << "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT" << "touch i.JPG j.jpg k.C";
+        QTest::newRow("own and dotted types") << "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav"
+                                              << "touch f.tar.gz g.themelet h.index";
+        QTest::newRow("content unlike the name") << "echo text > a.jpg; printf '\\211PNG\\r\\n\\032\\n' > b.mp3; touch c.wav d.pdf"
+                                                 << "echo text > e.jpg";
+        QTest::newRow("not regular files") << "touch t.txt" << "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg";
+    }
+
+    void mimeTypes()
+    {
+        QFETCH(QString, disk);
+        QFETCH(QString, changes);
+        const QString root = uniquePath();
+        run(root, disk);
+        FileManager manager(DbManager::instance(), nullptr);
+        QVERIFY(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
+        run(root, changes);
+        QVERIFY(waitIdle());
+        const QStringList rows = m_sql.rows("SELECT fileName, mimeType FROM file ORDER BY fileName;");
+        QVERIFY(rows.size() > 3);
+        const QMimeDatabase database;
+        for (const QString &row : rows)
+            QCOMPARE(row, row.section('|', 0, 0) + '|' + database.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
+    }
+
     // A picture that lands in a watched directory, followed by the service's own
     // loop: the event gives a stale file row, a later step reads the picture.
     void roadOfChange()
