@@ -1,11 +1,11 @@
 #include "filemanager.h"
 
 #include "content.h"
+#include "directorylisting.h"
 #include "queryagentdatabase.h"
 
 #include <QCoreApplication>
 #include <QDebug>
-#include <QDirIterator>
 #include <QFile>
 #include <QFileInfo>
 #include <QSqlError>
@@ -51,13 +51,7 @@ const int StackBufferSize = 4096;
 bool s_watchLimitReported = false;
 
 // One entry of a directory listing, keyed by its name in UTF-8.
-struct DiskEntry
-{
-    QByteArray name;
-    QString path;
-    QString fileName;
-    QDateTime modified;
-};
+using DiskEntry = DirectoryListing::Entry;
 
 bool byName(const DiskEntry &a, const DiskEntry &b)
 {
@@ -393,12 +387,11 @@ bool FileManager::readEvent()
                 directoryPaths << path;
             }
         } else if (header.mask & ArrivedMask) {
-            const QFileInfo info(path);
             m_fileIdQuery.bindValue(0, directory.id);
             m_fileIdQuery.bindValue(1, name);
             if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
                 m_fileIdQuery.finish();
-                updateTimes << modificationTime(info);
+                updateTimes << storedModificationTime(path);
                 updateDirectories << directory.id;
                 updateNames << name;
             } else {
@@ -406,13 +399,13 @@ bool FileManager::readEvent()
                 insertDirectories << directory.id;
                 insertTypes << m_mimeTyper.typeOfFile(path);
                 insertNames << name;
-                insertTimes << modificationTime(info);
+                insertTimes << storedModificationTime(path);
             }
         } else if (header.mask & LeftMask) {
             deleteDirectories << directory.id;
             deleteNames << name;
         } else if (header.mask & IN_MODIFY) {
-            updateTimes << modificationTime(QFileInfo(path));
+            updateTimes << storedModificationTime(path);
             updateDirectories << directory.id;
             updateNames << name;
         }
@@ -457,18 +450,8 @@ bool FileManager::scanDirectory()
 
     QVector<DiskEntry> files;
     QVector<DiskEntry> directories;
-    QDirIterator it(path, QDir::Dirs | QDir::Files | QDir::NoDotAndDotDot);
-    while (it.hasNext()) {
-        const QString entryPath = it.next();
-        const QFileInfo info = it.fileInfo();
-        if (!info.isDir()) {
-            // Also a link to a file: its own name, its target's time.
-            const QString fileName = info.fileName();
-            files.append({ fileName.toUtf8(), entryPath, fileName, modificationTime(info) });
-        } else if (!info.isSymLink()) {
-            directories.append({ info.fileName().toUtf8(), entryPath, QString(), QDateTime() });
-        }
-    }
+    // Also a link to a file: its own name, its target's time.
+    DirectoryListing::list(path, &files, &directories);
     if (!files.isEmpty())
         std::sort(files.begin(), files.end(), byName);
     if (!directories.isEmpty())
@@ -491,13 +474,18 @@ bool FileManager::scanDirectory()
                 insertDirectories << id;
                 insertTypes << m_mimeTyper.typeOfFile(file.path, true);
                 insertNames << file.fileName;
-                insertTimes << file.modified;
+                insertTimes << timeText(file.modified);
             },
             [&](const QSqlQuery &row) { deleteIds << row.value(0); },
             [&](const DiskEntry &file, const QSqlQuery &row) {
-                if ((scope == UserScope || scope == InstallScope)
-                    && file.modified != row.value(2).toDateTime()) {
-                    updateTimes << file.modified;
+                if (scope != UserScope && scope != InstallScope)
+                    return;
+                // The stored text is compared first: the instants only when it differs.
+                const QString modified = timeText(file.modified);
+                const QVariant stored = row.value(2);
+                if (stored.toString() != modified
+                    && QDateTime::fromMSecsSinceEpoch(file.modified, Qt::UTC) != stored.toDateTime()) {
+                    updateTimes << modified;
                     updateIds << row.value(0);
                 }
             });
@@ -627,7 +615,7 @@ qint64 FileManager::insertFile(const QString &path)
         m_fileInsert.bindValue(0, directoryId);
         m_fileInsert.bindValue(1, m_mimeTyper.typeOfFile(info.filePath()));
         m_fileInsert.bindValue(2, info.fileName());
-        m_fileInsert.bindValue(3, modificationTime(info));
+        m_fileInsert.bindValue(3, storedModificationTime(info.filePath()));
     });
     if (id == 0)
         return 0;

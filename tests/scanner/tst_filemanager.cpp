@@ -8,7 +8,8 @@ namespace {
 
 // Files on disk, current rows under a root of the scope, the changes made after the scan (all
 // read at once; after a "?" a foreign watch sees the parent directory), the index after them,
-// the signals (one a scan or a read), the warnings and the file names after each scan step.
+// the signals (one a scan or a read), the warnings, the file names after each scan step and the
+// time zone the process switches to once the rows are written.
 struct Case
 {
     int scope;
@@ -16,6 +17,7 @@ struct Case
     int signalCount;
     QStringList warnings = {};
     QString steps = {};
+    QByteArray zone = {};
 };
 
 // Changes on disk as a shell script run in directory, made if need be: one
@@ -115,6 +117,8 @@ private slots:
                 failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
         // By kind, not in the order of the events: deletes last.
         QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
+        // Rows written as local times are read in the zone of now: the process follows the change.
+        QTest::newRow("zone changed since the rows") << Case { 0, "touch a", "a", "", "/ a|0", 1, {}, {}, "Asia/Tokyo" };
         QTest::newRow("IN_MODIFY of a known file") << Case { 0, "touch a b", "a b", "echo x >> a", "/ a|0 b|1", 2 };
         // The scope 3 watch reports changes only: no new files.
         QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
@@ -150,6 +154,10 @@ private slots:
         const QString root = uniquePath();
         run(root, c.disk);
         addRows(root, QString("/=%1 ").arg(c.scope) + c.rows);
+        const QByteArray zone = qgetenv("TZ");
+        const auto restoreZone = qScopeGuard([&] { setTimeZone(zone); });
+        if (!c.zone.isEmpty())
+            setTimeZone(c.zone);
         MessageLog log(false);
         FileManager manager(DbManager::instance(), nullptr); // queues the roots
         QStringList names;
