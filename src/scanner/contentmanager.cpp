@@ -11,8 +11,6 @@
 #include <QFile>
 #include <QFileInfo>
 
-#include <cstdio>
-
 #include <sys/stat.h>
 
 ContentManager::ContentManager() = default;
@@ -89,11 +87,21 @@ QString ContentManager::timeText(qint64 msecs)
     if (year < 1 || year > 9999) // QDateTime's own text for the odd ones
         return QDateTime::fromMSecsSinceEpoch(msecs, Qt::UTC).toString(Qt::ISODateWithMs);
 
-    char text[32];
+    QString text(QStringLiteral("0000-00-00T00:00:00.000Z"));
+    QChar *out = text.data();
+    const auto put = [out](int at, int value, int digits) {
+        for (int i = at + digits - 1; i >= at; --i, value /= 10)
+            out[i] = QLatin1Char(char('0' + value % 10));
+    };
     const int seconds = int(rest / 1000);
-    std::snprintf(text, sizeof text, "%04d-%02d-%02dT%02d:%02d:%02d.%03dZ", int(year), month, day,
-                  seconds / 3600, seconds / 60 % 60, seconds % 60, int(rest % 1000));
-    return QString::fromLatin1(text, 24);
+    put(0, int(year), 4);
+    put(5, month, 2);
+    put(8, day, 2);
+    put(11, seconds / 3600, 2);
+    put(14, seconds / 60 % 60, 2);
+    put(17, seconds % 60, 2);
+    put(20, int(rest % 1000), 3);
+    return text;
 }
 
 ContentManager *ContentManager::managerFromType(int type)

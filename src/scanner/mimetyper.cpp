@@ -88,11 +88,7 @@ qint64 modificationTime(const QString &file)
 
 }
 
-MimeTyper::MimeTyper()
-{
-    m_usable = loadPatterns();
-    m_checked.start();
-}
+MimeTyper::MimeTyper() = default;
 
 bool MimeTyper::loadPatterns()
 {
@@ -147,9 +143,16 @@ bool MimeTyper::matchesOtherPattern(const QString &fileName) const
 {
     // Lower case on both sides covers the patterns that match case-sensitively too.
     const QString name = fileName.toLower();
-    if (m_otherNames.contains(name))
+    if (name.isEmpty() || m_otherNames.contains(name))
         return true;
+    const auto isLiteral = [](QChar c) {
+        return c != QLatin1Char('*') && c != QLatin1Char('?') && c != QLatin1Char('[') && c != QLatin1Char(']');
+    };
     for (const QString &pattern : m_otherGlobs) {
+        // A literal first or last character settles most names at once.
+        if ((isLiteral(pattern.front()) && pattern.front() != name.front())
+            || (isLiteral(pattern.back()) && pattern.back() != name.back()))
+            continue;
         if (globMatches(pattern.constBegin(), pattern.constEnd(), name.constBegin(), name.constEnd()))
             return true;
     }
@@ -165,7 +168,10 @@ QString MimeTyper::typeOfFile(const QString &path, bool isRegularFile)
             return m_database.mimeTypeForFile(path, QMimeDatabase::MatchDefault).name();
     }
 
-    if (m_checked.elapsed() > RecheckMilliseconds) {
+    if (!m_checked.isValid()) {
+        m_checked.start();
+        m_usable = loadPatterns();
+    } else if (m_checked.elapsed() > RecheckMilliseconds) {
         m_checked.restart();
         bool changed = false;
         for (const QString &file : qAsConst(m_globFiles))
