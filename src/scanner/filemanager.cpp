@@ -147,6 +147,9 @@ FileManager::FileManager(QueryAgentDatabase &database, QObject *parent)
         }, ConstructorSignature);
     if (!prepared)
         return;
+    // The merges read each listing once, in order.
+    m_fileQuery.setForwardOnly(true);
+    m_directoryQuery.setForwardOnly(true);
 
     commit();
     m_initialized = true;
