@@ -243,9 +243,10 @@ qint64 FileManager::appendDirectory(const QString &path, DirectoryScope scope, S
             m_directoryScopeUpdate.finish();
 
             // The next scan watches again, with the mask of the new scope.
-            const int wd = m_watches.key(WatchedDirectory { path + QLatin1Char('/'), 0 }, -1);
+            const int wd = watchOf(path + QLatin1Char('/'));
             if (wd != -1) {
                 m_watches.remove(wd);
+                m_watchIds.remove(path + QLatin1Char('/'));
                 inotify_rm_watch(m_inotifyFd, wd);
             }
         }
@@ -289,7 +290,7 @@ bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope
 
     const QString watchedPath = path + QLatin1Char('/');
     // A live watch means the directory is in step already.
-    if (m_watches.key(WatchedDirectory { watchedPath, 0 }, -1) != -1)
+    if (watchOf(watchedPath) != -1)
         return false;
 
     uint32_t mask = IndexScopeMask;
@@ -301,6 +302,7 @@ bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope
     const int wd = inotify_add_watch(m_inotifyFd, path.toUtf8().constData(), mask);
     if (wd >= 0) {
         m_watches[wd] = WatchedDirectory { watchedPath, *id };
+        m_watchIds.insert(watchedPath, wd);
         return true;
     }
     const int error = errno;
@@ -318,6 +320,7 @@ void FileManager::clearWatches()
     for (auto it = m_watches.constBegin(); it != m_watches.constEnd(); ++it)
         inotify_rm_watch(m_inotifyFd, it.key());
     m_watches = QHash<int, WatchedDirectory>();
+    m_watchIds = QHash<QString, int>();
 }
 
 bool FileManager::readEvent()
@@ -381,6 +384,8 @@ bool FileManager::readEvent()
             directoryDeletes << directory.id;
             if (!m_watches.isEmpty())
                 m_watches.remove(header.wd);
+            if (m_watchIds.value(directory.path, -1) == header.wd)
+                m_watchIds.remove(directory.path);
             inotify_rm_watch(m_inotifyFd, header.wd);
         } else if (header.mask & IN_ISDIR) {
             // Directories moved in or out are ignored; a deleted one reports on its own watch.
@@ -625,6 +630,13 @@ qint64 FileManager::insertFile(const QString &path)
 
     commit();
     return id;
+}
+
+int FileManager::watchOf(const QString &watchedPath) const
+{
+    // An entry whose watch now stands for another path is stale.
+    const int wd = m_watchIds.value(watchedPath, -1);
+    return wd != -1 && m_watches.value(wd).path == watchedPath ? wd : -1;
 }
 
 bool FileManager::isLinkedDirectory(const QString &path)

@@ -72,6 +72,7 @@ private:
     qint64 findOrInsert(QSqlQuery &lookup, const char *lookupFailure, QSqlQuery &insert,
                         const char *insertFailure, const std::function<void()> &bindInsert);
     bool readEvent();
+    int watchOf(const QString &watchedPath) const;
     bool scanDirectory();
     void postUpdate();
 
@@ -91,6 +92,7 @@ private:
     QSqlQuery m_directoryParentUpdate;
     QStringList m_pendingDirectories;
     QHash<int, WatchedDirectory> m_watches;
+    QHash<QString, int> m_watchIds; // by path: a lookup per scan, not a walk of all watches
     QList<ContentManager *> m_managers;
     MimeTyper m_mimeTyper;
     QElapsedTimer m_timer;
