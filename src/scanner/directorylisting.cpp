@@ -2,6 +2,9 @@
 
 #include <QFile>
 
+#include <algorithm>
+#include <cstring>
+
 #include <dirent.h>
 #include <fcntl.h>
 #include <sys/stat.h>
@@ -34,15 +37,23 @@ bool DirectoryListing::list(const QString &path, QVector<Entry> *files, QVector<
         if (isDirectory ? isLink : !isLink && !S_ISREG(target.st_mode))
             continue;
 
-        // Decoded as part of the whole path, as QDirIterator does: a name alone
-        // would lose a leading U+FEFF as a byte order mark.
-        const QByteArray nativePath = nativePrefix + name;
         Entry listed;
-        listed.path = QFile::decodeName(nativePath);
-        if (QFile::encodeName(listed.path) != nativePath || !listed.path.startsWith(prefix))
-            continue;
-        listed.fileName = listed.path.mid(prefix.size());
-        listed.name = listed.fileName.toUtf8();
+        const size_t length = std::strlen(name);
+        if (std::all_of(name, name + length, [](char c) { return uchar(c) < 0x80; })) {
+            // ASCII reads the same in any file-name encoding.
+            listed.name = QByteArray(name, int(length));
+            listed.fileName = QString::fromLatin1(listed.name);
+            listed.path = prefix + listed.fileName;
+        } else {
+            // Decoded as part of the whole path, as QDirIterator does: a name alone
+            // would lose a leading U+FEFF as a byte order mark.
+            const QByteArray nativePath = nativePrefix + name;
+            listed.path = QFile::decodeName(nativePath);
+            if (QFile::encodeName(listed.path) != nativePath || !listed.path.startsWith(prefix))
+                continue;
+            listed.fileName = listed.path.mid(prefix.size());
+            listed.name = listed.fileName.toUtf8();
+        }
         listed.modified = qint64(target.st_mtim.tv_sec) * 1000 + target.st_mtim.tv_nsec / 1000000;
         (isDirectory ? directories : files)->append(listed);
     }
