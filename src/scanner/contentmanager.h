@@ -27,8 +27,12 @@ public:
 
 protected:
     // A file's time as an instant: stored so, it reads back equal under any
-    // time zone, also in the repeated hour of a clock change.
+    // time zone, also in the repeated hour of a clock change. Read from stat
+    // as UTC, with no local-time conversion on the way.
     static QDateTime modificationTime(const QFileInfo &info);
+    // The same as the value the index stores: the text the SQL driver makes of it.
+    static QVariant storedModificationTime(const QString &path);
+    static QString timeText(qint64 msecs);
 
     // One step of a driver's list: the head runs until it reports no more,
     // then it is dropped. False once the list is empty.

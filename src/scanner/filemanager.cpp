@@ -1,11 +1,11 @@
 #include "filemanager.h"
 
 #include "content.h"
+#include "directorylisting.h"
 #include "queryagentdatabase.h"
 
 #include <QCoreApplication>
 #include <QDebug>
-#include <QDirIterator>
 #include <QFile>
 #include <QFileInfo>
 #include <QSqlError>
@@ -51,13 +51,7 @@ const int StackBufferSize = 4096;
 bool s_watchLimitReported = false;
 
 // One entry of a directory listing, keyed by its name in UTF-8.
-struct DiskEntry
-{
-    QByteArray name;
-    QString path;
-    QString fileName;
-    QDateTime modified;
-};
+using DiskEntry = DirectoryListing::Entry;
 
 bool byName(const DiskEntry &a, const DiskEntry &b)
 {
@@ -153,6 +147,9 @@ FileManager::FileManager(QueryAgentDatabase &database, QObject *parent)
         }, ConstructorSignature);
     if (!prepared)
         return;
+    // The merges read each listing once, in order.
+    m_fileQuery.setForwardOnly(true);
+    m_directoryQuery.setForwardOnly(true);
 
     commit();
     m_initialized = true;
@@ -246,9 +243,10 @@ qint64 FileManager::appendDirectory(const QString &path, DirectoryScope scope, S
             m_directoryScopeUpdate.finish();
 
             // The next scan watches again, with the mask of the new scope.
-            const int wd = m_watches.key(WatchedDirectory { path + QLatin1Char('/'), 0 }, -1);
+            const int wd = watchOf(path + QLatin1Char('/'));
             if (wd != -1) {
                 m_watches.remove(wd);
+                m_watchIds.remove(path + QLatin1Char('/'));
                 inotify_rm_watch(m_inotifyFd, wd);
             }
         }
@@ -292,7 +290,7 @@ bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope
 
     const QString watchedPath = path + QLatin1Char('/');
     // A live watch means the directory is in step already.
-    if (m_watches.key(WatchedDirectory { watchedPath, 0 }, -1) != -1)
+    if (watchOf(watchedPath) != -1)
         return false;
 
     uint32_t mask = IndexScopeMask;
@@ -304,6 +302,7 @@ bool FileManager::watchDirectory(const QString &path, qint64 *id, DirectoryScope
     const int wd = inotify_add_watch(m_inotifyFd, path.toUtf8().constData(), mask);
     if (wd >= 0) {
         m_watches[wd] = WatchedDirectory { watchedPath, *id };
+        m_watchIds.insert(watchedPath, wd);
         return true;
     }
     const int error = errno;
@@ -321,6 +320,7 @@ void FileManager::clearWatches()
     for (auto it = m_watches.constBegin(); it != m_watches.constEnd(); ++it)
         inotify_rm_watch(m_inotifyFd, it.key());
     m_watches = QHash<int, WatchedDirectory>();
+    m_watchIds = QHash<QString, int>();
 }
 
 bool FileManager::readEvent()
@@ -384,6 +384,8 @@ bool FileManager::readEvent()
             directoryDeletes << directory.id;
             if (!m_watches.isEmpty())
                 m_watches.remove(header.wd);
+            if (m_watchIds.value(directory.path, -1) == header.wd)
+                m_watchIds.remove(directory.path);
             inotify_rm_watch(m_inotifyFd, header.wd);
         } else if (header.mask & IN_ISDIR) {
             // Directories moved in or out are ignored; a deleted one reports on its own watch.
@@ -393,26 +395,25 @@ bool FileManager::readEvent()
                 directoryPaths << path;
             }
         } else if (header.mask & ArrivedMask) {
-            const QFileInfo info(path);
             m_fileIdQuery.bindValue(0, directory.id);
             m_fileIdQuery.bindValue(1, text(name));
             if (m_fileIdQuery.exec() && m_fileIdQuery.next()) {
                 m_fileIdQuery.finish();
-                updateTimes << modificationTime(info);
+                updateTimes << storedModificationTime(path);
                 updateDirectories << directory.id;
                 updateNames << name;
             } else {
                 m_fileIdQuery.finish();
                 insertDirectories << directory.id;
-                insertTypes << m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name();
+                insertTypes << m_mimeTyper.typeOfFile(path);
                 insertNames << name;
-                insertTimes << modificationTime(info);
+                insertTimes << storedModificationTime(path);
             }
         } else if (header.mask & LeftMask) {
             deleteDirectories << directory.id;
             deleteNames << name;
         } else if (header.mask & IN_MODIFY) {
-            updateTimes << modificationTime(QFileInfo(path));
+            updateTimes << storedModificationTime(path);
             updateDirectories << directory.id;
             updateNames << name;
         }
@@ -457,18 +458,8 @@ bool FileManager::scanDirectory()
 
     QVector<DiskEntry> files;
     QVector<DiskEntry> directories;
-    QDirIterator it(path, QDir::Dirs | QDir::Files | QDir::NoDotAndDotDot);
-    while (it.hasNext()) {
-        const QString entryPath = it.next();
-        const QFileInfo info = it.fileInfo();
-        if (!info.isDir()) {
-            // Also a link to a file: its own name, its target's time.
-            const QString fileName = info.fileName();
-            files.append({ fileName.toUtf8(), entryPath, fileName, modificationTime(info) });
-        } else if (!info.isSymLink()) {
-            directories.append({ info.fileName().toUtf8(), entryPath, QString(), QDateTime() });
-        }
-    }
+    // Also a link to a file: its own name, its target's time.
+    DirectoryListing::list(path, &files, &directories);
     if (!files.isEmpty())
         std::sort(files.begin(), files.end(), byName);
     if (!directories.isEmpty())
@@ -489,15 +480,20 @@ bool FileManager::scanDirectory()
                 if (scope != UserScope)
                     return;
                 insertDirectories << id;
-                insertTypes << m_mimeDatabase.mimeTypeForFile(file.path, QMimeDatabase::MatchDefault).name();
+                insertTypes << m_mimeTyper.typeOfFile(file.path, true);
                 insertNames << file.fileName;
-                insertTimes << file.modified;
+                insertTimes << timeText(file.modified);
             },
             [&](const QSqlQuery &row) { deleteIds << row.value(0); },
             [&](const DiskEntry &file, const QSqlQuery &row) {
-                if ((scope == UserScope || scope == InstallScope)
-                    && file.modified != row.value(2).toDateTime()) {
-                    updateTimes << file.modified;
+                if (scope != UserScope && scope != InstallScope)
+                    return;
+                // The stored text is compared first: the instants only when it differs.
+                const QString modified = timeText(file.modified);
+                const QVariant stored = row.value(2);
+                if (stored.toString() != modified
+                    && QDateTime::fromMSecsSinceEpoch(file.modified, Qt::UTC) != stored.toDateTime()) {
+                    updateTimes << modified;
                     updateIds << row.value(0);
                 }
             });
@@ -625,15 +621,22 @@ qint64 FileManager::insertFile(const QString &path)
     const qint64 id = findOrInsert(m_fileIdQuery, "Failed to execute m_fileIdQuery.",
                                    m_fileInsert, "Failed to execute m_fileInsert.", [&]() {
         m_fileInsert.bindValue(0, directoryId);
-        m_fileInsert.bindValue(1, m_mimeDatabase.mimeTypeForFile(info, QMimeDatabase::MatchDefault).name());
+        m_fileInsert.bindValue(1, m_mimeTyper.typeOfFile(info.filePath()));
         m_fileInsert.bindValue(2, text(info.fileName()));
-        m_fileInsert.bindValue(3, modificationTime(info));
+        m_fileInsert.bindValue(3, storedModificationTime(info.filePath()));
     });
     if (id == 0)
         return 0;
 
     commit();
     return id;
+}
+
+int FileManager::watchOf(const QString &watchedPath) const
+{
+    // An entry whose watch now stands for another path is stale.
+    const int wd = m_watchIds.value(watchedPath, -1);
+    return wd != -1 && m_watches.value(wd).path == watchedPath ? wd : -1;
 }
 
 bool FileManager::isLinkedDirectory(const QString &path)

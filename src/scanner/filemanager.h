@@ -2,11 +2,11 @@
 #define FILEMANAGER_H
 
 #include "contentmanager.h"
+#include "mimetyper.h"
 #include "queryactor.h"
 
 #include <QElapsedTimer>
 #include <QHash>
-#include <QMimeDatabase>
 #include <QSocketNotifier>
 #include <QSqlQuery>
 #include <QStringList>
@@ -72,6 +72,7 @@ private:
     qint64 findOrInsert(QSqlQuery &lookup, const char *lookupFailure, QSqlQuery &insert,
                         const char *insertFailure, const std::function<void()> &bindInsert);
     bool readEvent();
+    int watchOf(const QString &watchedPath) const;
     bool scanDirectory();
     void postUpdate();
 
@@ -91,8 +92,9 @@ private:
     QSqlQuery m_directoryParentUpdate;
     QStringList m_pendingDirectories;
     QHash<int, WatchedDirectory> m_watches;
+    QHash<QString, int> m_watchIds; // by path: a lookup per scan, not a walk of all watches
     QList<ContentManager *> m_managers;
-    QMimeDatabase m_mimeDatabase;
+    MimeTyper m_mimeTyper;
     QElapsedTimer m_timer;
     int m_inotifyFd;
     bool m_initialized = false;

@@ -225,7 +225,7 @@ void IndexManager::merge(const QVector<Entry> &entries, qint64 directoryId, Chan
             previous = entry.fileName;
             changes->insertDirectoryIds.append(directoryId);
             changes->insertMimeTypes.append(
-                    m_mimeDatabase.mimeTypeForFile(entry.path, QMimeDatabase::MatchDefault).name());
+                    m_mimeTyper.typeOfFile(entry.path));
             changes->insertFileNames.append(entry.fileName);
             changes->insertDisplayNames.append(entry.displayName);
             changes->insertCategories.append(entry.category);
@@ -254,7 +254,7 @@ void IndexManager::merge(const QVector<Entry> &entries, qint64 directoryId, Chan
                 || entry.category != m_fileQuery.value(3).toString()) {
             changes->updateIds.append(m_fileQuery.value(0));
             changes->updateMimeTypes.append(
-                    m_mimeDatabase.mimeTypeForFile(entry.path, QMimeDatabase::MatchDefault).name());
+                    m_mimeTyper.typeOfFile(entry.path));
             changes->updateDisplayNames.append(entry.displayName);
             changes->updateTimes.append(entry.modificationTime);
             changes->updateCategories.append(entry.category);

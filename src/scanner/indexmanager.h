@@ -2,9 +2,9 @@
 #define INDEXMANAGER_H
 
 #include "contentmanager.h"
+#include "mimetyper.h"
 #include "queryactor.h"
 
-#include <QMimeDatabase>
 #include <QSqlQuery>
 #include <QVector>
 
@@ -34,7 +34,7 @@ private:
     QSqlQuery m_fileDelete;
     QSqlQuery m_modifiedReset;
     QSqlQuery m_renameQuery;
-    QMimeDatabase m_mimeDatabase;
+    MimeTyper m_mimeTyper;
 };
 
 #endif

@@ -8,7 +8,8 @@ namespace {
 
 // Files on disk, current rows under a root of the scope, the changes made after the scan (all
 // read at once; after a "?" a foreign watch sees the parent directory), the index after them,
-// the signals (one a scan or a read), the warnings and the file names after each scan step.
+// the signals (one a scan or a read), the warnings, the file names after each scan step and the
+// time zone the process switches to once the rows are written.
 struct Case
 {
     int scope;
@@ -16,6 +17,7 @@ struct Case
     int signalCount;
     QStringList warnings = {};
     QString steps = {};
+    QByteArray zone = {};
 };
 
 // Changes on disk as a shell script run in directory, made if need be: one
@@ -115,6 +117,8 @@ private slots:
                 failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
         // By kind, not in the order of the events: deletes last.
         QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
+        // Rows written as local times are read in the zone of now: the process follows the change.
+        QTest::newRow("zone changed since the rows") << Case { 0, "touch a", "a", "", "/ a|0", 1, {}, {}, "Asia/Tokyo" };
         QTest::newRow("IN_MODIFY of a known file") << Case { 0, "touch a b", "a b", "echo x >> a", "/ a|0 b|1", 2 };
         // The scope 3 watch reports changes only: no new files.
         QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
@@ -151,6 +155,10 @@ private slots:
         const QString root = uniquePath();
         run(root, c.disk);
         addRows(root, QString("/=%1 ").arg(c.scope) + c.rows);
+        const QByteArray zone = qgetenv("TZ");
+        const auto restoreZone = qScopeGuard([&] { setTimeZone(zone); });
+        if (!c.zone.isEmpty())
+            setTimeZone(c.zone);
         MessageLog log(false);
         FileManager manager(DbManager::instance(), nullptr); // queues the roots
         QStringList names;
@@ -234,6 +242,43 @@ private slots:
         QCOMPARE(tree(root), QString("+t.txt|0 /"));
         run(root, "echo x >> t.txt");
         QVERIFY(pendingBytes(manager) > 0);
+    }
+
+    // The types the scan and the events store are QMimeDatabase's, also for names that share
+    // an extension but not a type, names whose content decides and files that aren't regular.
+    void mimeTypes_data()
+    {
+        QTest::addColumn<QString>("disk");
+        QTest::addColumn<QString>("changes");
+        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >";
+        QTest::newRow("ogg: vorbis, opus, empty, text, png") << vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg"
+                                                   << vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; printf '\\211PNG\\r\\n\\032\\n' > p.ogg";
+        QTest::newRow("man pages and other globs") << "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ Makefile.am a.anim1"
+                                                   << "touch d.1 e.so.2 456.vdr";
+        QTest::newRow("no extension") << "echo text > plain; printf '\\211PNG\\r\\n\\032\\n' > png; : > empty" << "echo x > plain2; : > empty2";
+        QTest::newRow("case") << "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT" << "touch i.JPG j.jpg k.C";
+        QTest::newRow("own and dotted types") << "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav"
+                                              << "touch f.tar.gz g.themelet h.index";
+        QTest::newRow("content unlike the name") << "echo text > a.jpg; printf '\\211PNG\\r\\n\\032\\n' > b.mp3; touch c.wav d.pdf"
+                                                 << "echo text > e.jpg";
+        QTest::newRow("not regular files") << "touch t.txt" << "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg";
+    }
+
+    void mimeTypes()
+    {
+        QFETCH(QString, disk);
+        QFETCH(QString, changes);
+        const QString root = uniquePath();
+        run(root, disk);
+        FileManager manager(DbManager::instance(), nullptr);
+        QVERIFY(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
+        run(root, changes);
+        QVERIFY(waitIdle());
+        const QStringList rows = m_sql.rows("SELECT fileName, mimeType FROM file ORDER BY fileName;");
+        QVERIFY(rows.size() > 3);
+        const QMimeDatabase database;
+        for (const QString &row : rows)
+            QCOMPARE(row, row.section('|', 0, 0) + '|' + database.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
     }
 
     // A picture that lands in a watched directory, followed by the service's own
