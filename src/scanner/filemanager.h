@@ -64,6 +64,8 @@ public:
 
     // True while an update event is on its way or a pass is running.
     bool isUpdateQueued() const { return m_updateQueued; }
+    // Directories queued for a scan.
+    int pendingDirectoryCount() const { return m_pendingDirectories.size(); }
 
 protected:
     bool event(QEvent *event) override;

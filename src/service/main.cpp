@@ -1,3 +1,4 @@
+#include "statusadaptor.h"
 #include "themeletdadaptor.h"
 #include "themeletservice.h"
 
@@ -119,6 +120,7 @@ int main(int argc, char *argv[])
     // Nothing touches the index before the name is ours.
     ThemeletService service;
     new ThemeletdAdaptor(&service);
+    new StatusAdaptor(&service);
     if (!bus.registerObject(QLatin1String(ThemeletService::ObjectPath), &service)) {
         std::fprintf(stderr, "themeletd: cannot register the object %s\n", ThemeletService::ObjectPath);
         return 1;

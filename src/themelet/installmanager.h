@@ -35,6 +35,9 @@ public:
     bool updateMetaData() override;
     bool event(QEvent *event) override;
 
+    // Install directories and packages queued for reading.
+    int pendingCount() const { return m_pendingDirectories.size() + m_pendingInstalls.size(); }
+
 private:
     struct FileEntry;
 

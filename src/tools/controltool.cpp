@@ -421,6 +421,13 @@ int ControlTool::status(const QStringList &)
     const bool readable = exists && m_index.statistics(&counts, &version);
     if (exists && !readable)
         ContentPrinter::printError(m_index.errorString());
+    // Before its first scan commits the index looks settled: what the service
+    // has queued counts as pending too.
+    const qint64 queued = running ? m_service.queued() : 0;
+    for (auto &count : counts) {
+        if (count.first == QLatin1String("pending") && queued > 0)
+            count.second += queued;
+    }
     const QUrl active = activeSource();
 
     if (m_json) {

@@ -83,6 +83,15 @@ uint ServiceClient::pid()
     return reply.isValid() ? reply.value() : 0;
 }
 
+qint64 ServiceClient::queued()
+{
+    const QDBusMessage call = QDBusMessage::createMethodCall(serviceName(), QLatin1String(ThemeletInterface::s_objectPath),
+                                                             QStringLiteral("com.vorka.themeletd.Status"),
+                                                             QStringLiteral("queued"));
+    const QDBusReply<qlonglong> reply = connection().call(call, QDBus::Block, 5000);
+    return reply.isValid() ? reply.value() : -1;
+}
+
 bool ServiceClient::wait(QDBusPendingCall call)
 {
     call.waitForFinished();

@@ -21,6 +21,8 @@ public:
     bool ensureRunning();
     // 0 when unknown.
     uint pid();
+    // Directories and packages the service has queued for reading; -1 when unknown.
+    qint64 queued();
 
     ThemeletInterface *proxy() const;
     QDBusConnection connection() const;
