@@ -560,6 +560,12 @@ void ThemeletService::installPackage(const QString &path)
         fail(InvalidArgs, QStringLiteral("'%1' is not a directory").arg(directory));
         return;
     }
+    // What an install reads: .themelet and .index files directly in the package.
+    if (QDir(directory).entryList({ QStringLiteral("*.themelet"), QStringLiteral("*.index") },
+                                  QDir::Files | QDir::Hidden).isEmpty()) {
+        fail(InvalidArgs, QStringLiteral("Nothing to install in '%1': no .themelet or .index file in it").arg(directory));
+        return;
+    }
     // Installing turns the directory into a package: a user's or an install directory stays what it is.
     m_directoryQuery.bindValue(0, directory);
     if (!m_directoryQuery.exec()) {

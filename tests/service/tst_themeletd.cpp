@@ -315,6 +315,7 @@ private slots:
         QTest::newRow("relative package") << "installPackage" << QVariantList { "extra" } << invalid;
         QTest::newRow("watched directory as package") << "installPackage" << QVariantList { m_watched } << invalid;
         QTest::newRow("missing package") << "installPackage" << QVariantList { "/nonexistent" } << notFound;
+        QTest::newRow("nothing installable") << "installPackage" << QVariantList { m_sandbox + "/loose" } << invalid + "|Nothing to install";
         QTest::newRow("missing picture") << "createThemelet" << QVariantList { "file:///nonexistent.jpg" } << notFound;
         QTest::newRow("no picture") << "createThemelet" << QVariantList { "file://" + m_package + "/sunset.themelet" } << invalid;
         QTest::newRow("device") << "createThemelet" << QVariantList { "file:///dev/zero" } << invalid;
