@@ -25,13 +25,15 @@ public:
     static ContentManager *managerFromType(int type);
     static QList<ContentManager *> scannerManagers();
 
+    // The value the index stores for a file's time: the text the SQL driver
+    // makes of modificationTime(). Public for the service's own rows.
+    static QVariant storedModificationTime(const QString &path);
+
 protected:
     // A file's time as an instant: stored so, it reads back equal under any
     // time zone, also in the repeated hour of a clock change. Read from stat
     // as UTC, with no local-time conversion on the way.
     static QDateTime modificationTime(const QFileInfo &info);
-    // The same as the value the index stores: the text the SQL driver makes of it.
-    static QVariant storedModificationTime(const QString &path);
     static QString timeText(qint64 msecs);
 
     // One step of a driver's list: the head runs until it reports no more,

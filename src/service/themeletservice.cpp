@@ -7,6 +7,7 @@
 #include "installmanager.h"
 #include "profile.h"
 #include "queryagent.h"
+#include "soundthemes.h"
 #include "themeletcolor.h"
 #include "themeletmanager.h"
 #include "themelettones.h"
@@ -160,6 +161,8 @@ void ThemeletService::start(const QStringList &watchedDirectories)
     nestInstallPaths(roots);
     for (const QString &path : InstallManager::installPaths())
         installer->appendDirectory(path);
+    if (SoundThemes::update(DbManager::instance()) > 0)
+        Content::signalChanged(ThemeletContent::File);
     m_started = true;
 }
 
@@ -594,6 +597,8 @@ void ThemeletService::refreshThemelets()
     for (const QString &path : InstallManager::installPaths())
         installer->appendDirectory(path);
     installer->refreshInstalls();
+    if (SoundThemes::update(DbManager::instance()) > 0)
+        Content::signalChanged(ThemeletContent::File);
 }
 
 void ThemeletService::remove(int contentType, qlonglong contentId)

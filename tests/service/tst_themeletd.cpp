@@ -110,6 +110,9 @@ private slots:
         QVERIFY(write(m_sandbox + "/bomb.png", png));
         // A watched tree that holds the install paths is indexed whole; they keep their scopes.
         QVERIFY(write(Sysroot::path("/usr/share/doc/readme.txt"), "x"));
+        // The system's sound theme: its sounds are tones, read-only.
+        QVERIFY(write(Sysroot::path("/usr/share/sounds/freedesktop/index.theme"), "[Sound Theme]\nName=Default\n")
+                && write(Sysroot::path("/usr/share/sounds/freedesktop/stereo/bell.oga"), "OggS"));
         QVERIFY(Service::start(m_service, { m_watched, Sysroot::path("/usr/share") }));
         QVERIFY(!QFile::exists(halfMade));
         QVERIFY(QDBusConnection::sessionBus().connect(Service::Name, Service::Path, Service::Name, "contentChanged", this,
@@ -214,6 +217,7 @@ private slots:
         QCOMPARE(query("SELECT scope FROM directory WHERE path = '" + m_package + "' OR path = '" + Sysroot::path("/usr/share/themelet")
                        + "' ORDER BY length(path)"), QString("1;2"));
         QCOMPARE(query("SELECT permissions FROM file WHERE id = " + QString::number(m_sunsetId)), QString("1"));
+        QCOMPARE(query("SELECT displayName, permissions, mimeType GLOB 'audio/*' FROM file WHERE fileName = 'bell.oga'"), QString("bell|1|1"));
     }
 
     void createAndSet()
