@@ -15,7 +15,7 @@
 
 #include <algorithm>
 #include <cstdlib>
-#include <sys/resource.h>
+#include <ctime>
 
 // No managers run here, so no change is ever announced.
 void Content::signalChanged(int)
@@ -27,14 +27,38 @@ namespace {
 // 100,000 unless the first argument says otherwise (bench/run --quick, --tiny).
 int s_rows = 100000;
 
-// CPU time of the calling thread: the pool threads and other processes share
-// the cores, and time spent waiting for them is not the merge's.
+// Each side runs until it has used at least this much CPU, so that neither
+// is read off a clock tick or two.
+const qint64 MinimumNanoseconds = 100 * 1000 * 1000;
+
+// CPU time of the calling thread, to the nanosecond: the pool threads and other
+// processes share the cores, and time spent waiting for them is not the merge's.
 qint64 threadNanoseconds()
 {
-    rusage usage {};
-    getrusage(RUSAGE_THREAD, &usage);
-    return (qint64(usage.ru_utime.tv_sec) + usage.ru_stime.tv_sec) * 1000000000
-            + (qint64(usage.ru_utime.tv_usec) + usage.ru_stime.tv_usec) * 1000;
+    timespec now {};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &now);
+    return qint64(now.tv_sec) * 1000000000 + now.tv_nsec;
+}
+
+// Where the copies leave a trace, so that the compiler can't drop them.
+volatile quintptr s_sink = 0;
+
+// The baseline: one copy of the handles, averaged over enough repetitions.
+qint64 copyNanoseconds(const QVector<Content> &rows)
+{
+    qint64 total = 0;
+    int repetitions = 0;
+    while (total < MinimumNanoseconds) {
+        const qint64 start = threadNanoseconds();
+        QVector<Content> copy;
+        copy.reserve(rows.size());
+        for (const Content &row : rows)
+            copy.append(row);
+        s_sink = s_sink + quintptr(copy.constLast().data()) + quintptr(copy.size());
+        total += threadNanoseconds() - start;
+        ++repetitions;
+    }
+    return total / repetitions;
 }
 
 // Times the model's own events: the batches arriving and the update passes.
@@ -127,13 +151,7 @@ bool measure(Measure *measure, bool holdReplaced)
     measure->inserts += model.inserts;
     measure->removes += model.removes;
 
-    const QVector<Content> rows = model.rows();
-    const qint64 start = threadNanoseconds();
-    QVector<Content> copy;
-    copy.reserve(rows.size());
-    for (const Content &row : rows)
-        copy.append(row);
-    measure->copies << threadNanoseconds() - start;
+    measure->copies << copyNanoseconds(model.rows());
     return true;
 }
 
@@ -162,17 +180,20 @@ int main(int argc, char **argv)
     // Held: something else keeps them, which leaves the merge itself.
     Measure plain;
     Measure held;
-    for (int run = 0; run < 5; ++run) {
+    qint64 merged = 0;
+    for (int run = 0; run < 5 || merged < MinimumNanoseconds; ++run) {
         if (!measure(&plain, false) || !measure(&held, true))
             return 1;
+        merged += plain.merges.constLast();
     }
     const qint64 copy = median(plain.copies + held.copies);
     const auto ratio = [copy](const Measure &measure) {
         return QString::number(double(median(measure.merges)) / double(std::max<qint64>(1, copy)), 'f', 2);
     };
     out << "merge of " << s_rows << " identical rows in batches of " << QueryAgent::BatchSize << ": "
-        << median(plain.merges) / 1000 << " us (" << median(held.merges) / 1000
-        << " us with the replaced records held elsewhere); plain copy of as many handles: " << copy / 1000 << " us\n";
+        << double(median(plain.merges)) / 1000 << " us (" << double(median(held.merges)) / 1000
+        << " us with the replaced records held elsewhere); plain copy of as many handles: " << double(copy) / 1000
+        << " us (thread CPU time, each side repeated to at least 100 ms)\n";
     out << "ratio=" << ratio(plain) << " ratioHeld=" << ratio(held) << " inserts=" << plain.inserts + held.inserts
         << " removes=" << plain.removes + held.removes << '\n';
     return 0;
