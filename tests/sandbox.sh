@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-FileCopyrightText: 2026 The themelet authors
+# SPDX-License-Identifier: LGPL-2.1-or-later
 # Runs one test in a throw-away environment: nothing touches the real home,
 # /usr/share or the user's session bus.
 set -u

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // Seeded data sets for the benchmarks:
 //   bench_gen tree DIR FILES DIRS SEED     a two-level tree of tones and documents
 //   bench_gen jpegs DIR FILES SEED         pictures with EXIF date and orientation

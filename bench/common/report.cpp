@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // Turns the RESULT lines of the measures into one table or one JSON document.
 //   bench_report [--json] RESULTS_FILE MEASURE...
 // A measure without a line shows as "error", so a crashed program still has its row.

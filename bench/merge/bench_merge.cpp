@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The GUI thread's share of a re-query that finds nothing changed: 100,000
 // rows arrive from the index in batches of 50 and are merged into the same
 // 100,000 rows on show. Reported against a plain copy of as many Content

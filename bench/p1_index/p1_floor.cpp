@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The floor of a first index: walk the tree with readdir and stat, type files
 // by their extension, and write every row with one batched insert in one
 // transaction, through the same SQLite driver as the engine.

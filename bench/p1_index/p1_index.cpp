@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // P1 and P6: the first index of a tree by themeletd, against the floor program.
 //   bench_p1_index ROOT FILES FLOOR -- DAEMON ARGS...
 // Run in a sandbox (fresh XDG_DATA_HOME and session bus). Time runs from the

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // P2: picture metadata. The engine's loop (FileManager driving ImageManager, as
 // in themeletd) reads a directory of pictures; its rate from the moment the scan
 // committed the file rows until every image row is written is compared with a

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // P3: a burst of new pictures in one watched directory. themeletd watches an
 // empty directory; once its inotify watch on it exists (read from
 // /proc/PID/fdinfo), FILES copies of a picture are written there as fast as

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // P4: the photo list of a large index. Time from componentComplete until the
 // model's status is Finished with every row in place, against the sqlite3
 // command line running the same SELECT into /dev/null (mean of a run before

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // P8: a restart over an unchanged tree, what every boot of a phone does.
 //   bench_p8_restart ROOT FILES -- DAEMON ARGS...
 //   bench_p8_restart --walk ROOT     (the baseline: readdir + stat of every entry)

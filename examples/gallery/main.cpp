@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // themelet-gallery: themelets, photos and tones of the index, shown through the
 // Orbaline.Themelet QML module. Besides the interactive window it has a
 // non-interactive mode for scripts and tests: wait until the three lists are

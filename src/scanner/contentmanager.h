@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 #ifndef CONTENTMANAGER_H
 #define CONTENTMANAGER_H
 

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // A test started by hand, outside ctest, would write into the real home,
 // /usr/share and the user's session bus. Such a start re-runs itself through
 // sandbox.sh, which sets THEMELET_SANDBOX.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // TSan builds only. Qt 5's QMutex locks with futexes inside libQt5Core, which
 // ThreadSanitizer can't see, so every access guarded by a QMutex looked like a
 // race. These definitions take the place of Qt's for the code of this project,

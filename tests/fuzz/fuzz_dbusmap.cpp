@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The service's demarshalling of a{sv} maps. The input is a recipe for a
 // nested value (maps with string and integer keys, arrays, structures,
 // variants, basic values), sent over a peer-to-peer connection to an object of

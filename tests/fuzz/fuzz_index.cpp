@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // .index files through IndexManager::updateMetaData: parsing, aliases and the
 // merge against the rows of the described directory, which keep what earlier
 // inputs made of them.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The list difference on arbitrary pairs of lists. Byte 0 is the length of
 // the old list, byte 1 the batch size (bit 7: the pure difference instead of
 // the incremental merge), then the ids of the old rows and of the new ones,

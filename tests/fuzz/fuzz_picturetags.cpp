@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The picture-tag adapter over exiv2 on arbitrary bytes: tags are absent or
 // of their type, never an exception or a crash.
 #include "fuzzsupport.h"

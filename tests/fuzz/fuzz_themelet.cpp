@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // .themelet files through ThemeletManager::updateMetaData: parsing, the merge
 // with existing rows and the write phase. The input is split at byte 0x1e into
 // up to three files of one package; only the files given are rewritten and

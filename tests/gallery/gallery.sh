@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-FileCopyrightText: 2026 The themelet authors
+# SPDX-License-Identifier: LGPL-2.1-or-later
 # The gallery against the real service and generated sample content, under
 # xvfb-run on the sandbox's private bus: the three lists fill and finish,
 # tapping a themelet makes it current (in the configuration too), a themelet

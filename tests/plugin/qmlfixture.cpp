@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // Writes the content that the QML tests list, and its index, as the service would,
 // in another process than the client: themelets, tones and photos, or with
 // "photo NAME" one more photo in the watched directory.

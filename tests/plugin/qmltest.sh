@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-FileCopyrightText: 2026 The themelet authors
+# SPDX-License-Identifier: LGPL-2.1-or-later
 # Runs one QML test file in the sandbox that sandbox.sh made: the index is
 # written first by another process (the fixture), then qmltestrunner runs the
 # file. Every QML warning counts as a failure.

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 import QtQuick 2.0
 import QtTest 1.2
 import Orbaline.Themelet 1.0

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The module as a client process gets it: found through QML2_IMPORT_PATH alone,
 // in a program that links nothing of ours and defines no Content::signalChanged.
 #include <QDBusConnection>

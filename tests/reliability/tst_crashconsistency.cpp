@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // themeletd killed by SIGKILL at random moments during the first index, a burst of creates and deletes,
 // and a package install; after each kill the index passes PRAGMA integrity_check, the service restarts
 // and answers without rebuilding it, and once idle the rows equal the disk. A scan leaves one row behind

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // Hostile calls on themeletd's D-Bus interface: wrong types and arity, unknown
 // methods, ids and types, URLs that are no local files or lead elsewhere, and
 // huge or deeply nested maps. Every call gets an answer, the service lives on,

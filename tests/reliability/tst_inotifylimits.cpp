@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // themeletd short of inotify resources: first in a user namespace whose watch
 // limit is below the number of directories, then with its event queue
 // overflowed while it is stopped. It keeps running and answering, explains each

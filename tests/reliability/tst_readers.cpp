@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // themeletd indexes a fresh tree twice: alone, then while two client processes
 // of four threads query themelets, files and photos in a loop through the query
 // agents. Every query must succeed and be one snapshot (a directory's files are

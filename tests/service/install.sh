@@ -1,4 +1,6 @@
 #!/usr/bin/env bash
+# SPDX-FileCopyrightText: 2026 The themelet authors
+# SPDX-License-Identifier: LGPL-2.1-or-later
 # Installs the build into a temporary prefix and uses it from there: themeletd
 # started by D-Bus activation on a private bus whose only service directory is
 # the prefix's, the installed themeletctl talking to it, the QML module loaded,

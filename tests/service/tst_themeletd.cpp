@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // The real themeletd on the sandbox's private bus, with the integration files of the build tree.
 #include "dconftest.h"
 #include "profilemanager.h"

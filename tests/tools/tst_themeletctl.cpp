@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 // themeletctl end to end: the real client against the real themeletd on the
 // sandbox's private bus, over a package, a tone pack and a Pictures folder.
 #include "servicefixture.h"

@@ -1,3 +1,6 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
 import QtQuick 2.15
 
 // A model's status at a glance: grey Null, amber Querying, green Finished, red Error.
