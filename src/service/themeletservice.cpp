@@ -220,7 +220,7 @@ void ThemeletService::stop()
     database.close();
 }
 
-bool ThemeletService::fail(Error error, const QString &message, const QDBusMessage *call)
+bool ThemeletService::fail(Error error, const QString &message, const DelayedReply *call)
 {
     static const char *const names[] = { "InvalidArgs", "NotFound", "ReadOnly", "Failed" };
     QString line = message.left(MaxMessageLength);
@@ -231,7 +231,7 @@ bool ThemeletService::fail(Error error, const QString &message, const QDBusMessa
     const QString name = QLatin1String("com.vorka.themeletd.Error.") + QLatin1String(names[error]);
     qWarning().noquote() << name << line;
     if (call)
-        QDBusConnection::sessionBus().send(call->createErrorReply(name, line));
+        call->connection.send(call->message.createErrorReply(name, line));
     else if (calledFromDBus())
         sendErrorReply(name, line);
     return false;
@@ -439,21 +439,21 @@ qlonglong ThemeletService::createThemelet(const QString &url)
     // Decoding a big picture takes seconds: it is done off the loop, so that
     // every other client is served meanwhile, and the reply follows.
     setDelayedReply(true);
-    const QDBusMessage call = message();
+    const DelayedReply call { connection(), message() };
     m_pictureReader.start([this, path, call]() {
         bool tooLarge = false;
         const QImage thumbnail = WallpaperPalette::readThumbnail(path, &tooLarge);
         QMetaObject::invokeMethod(this, [this, path, call, thumbnail, tooLarge]() {
             const qlonglong id = makeThemelet(path, thumbnail, tooLarge, &call);
             if (id != 0)
-                QDBusConnection::sessionBus().send(call.createReply(QVariant::fromValue(id)));
+                call.connection.send(call.message.createReply(QVariant::fromValue(id)));
         }, Qt::QueuedConnection);
     });
     return 0;
 }
 
 qlonglong ThemeletService::makeThemelet(const QString &path, const QImage &thumbnail, bool tooLarge,
-                                        const QDBusMessage *call)
+                                        const DelayedReply *call)
 {
     const QFileInfo info(path);
     if (tooLarge)

@@ -9,6 +9,7 @@
 #include "themeletapplier.h"
 #include "themeletsettings.h"
 
+#include <QDBusConnection>
 #include <QDBusContext>
 #include <QDBusMessage>
 #include <QImage>
@@ -56,6 +57,13 @@ signals:
 private:
     enum Error { InvalidArgs, NotFound, ReadOnly, Failed };
 
+    // A call answered later, on the connection it came from.
+    struct DelayedReply
+    {
+        QDBusConnection connection;
+        QDBusMessage message;
+    };
+
     struct FileRow
     {
         bool found = false;
@@ -66,8 +74,8 @@ private:
 
     // Logs and replies with the error: to `call` if given (a delayed reply), else
     // to the D-Bus call being handled, if any.
-    bool fail(Error error, const QString &message, const QDBusMessage *call = nullptr);
-    qlonglong makeThemelet(const QString &path, const QImage &thumbnail, bool tooLarge, const QDBusMessage *call);
+    bool fail(Error error, const QString &message, const DelayedReply *call = nullptr);
+    qlonglong makeThemelet(const QString &path, const QImage &thumbnail, bool tooLarge, const DelayedReply *call);
     QString localPath(const QString &url, const char *what);
     ContentManager *writableManager(int contentType);
     bool findContent(int contentType, qint64 id, FileRow *row);
