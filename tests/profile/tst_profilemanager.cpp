@@ -135,7 +135,11 @@ private slots:
         manager.setRingerToneFile("");
         manager.setRingerToneFile("");
         manager.setRingerVolume(0);
-        QCOMPARE(log.names.join(' '), "ringerVolumeChanged ringerToneFileChanged ringerToneFileChanged ringerToneFileChanged");
+        manager.setRingerVolume(40);
+        manager.setProfile(ProfileManager::Silent);
+        manager.setProfile(ProfileManager::Silent);
+        QCOMPARE(log.names.join(' '), "ringerVolumeChanged ringerToneFileChanged ringerToneFileChanged ringerToneFileChanged "
+                                      "ringerVolumeChanged profileChanged");
     }
 
     // The clearing calls touch no cache and signal nothing themselves; what they cleared
