@@ -403,6 +403,7 @@ void AbstractContentModel::removeRange(int index, int count)
     if (count < 1)
         return;
     beginRemoveRows(QModelIndex(), index, index + count - 1);
+    m_released += m_currentContent->mid(index, count);
     m_currentContent->removeRange(index, count);
     endRemoveRows();
     emit countChanged();
@@ -413,8 +414,21 @@ void AbstractContentModel::updateRange(int index, int count, const QVector<Conte
     // Dead during filter passes: rows that stay under a filter keep the record they had.
     if (m_synchronizing || count < 1)
         return;
+    m_released += m_currentContent->mid(index, count);
     m_currentContent->updateRange(index, count, source, sourceIndex);
     emit dataChanged(this->index(index), this->index(index + count - 1));
+}
+
+// Replaced and removed records are freed on a pool thread: on a re-query of
+// 100,000 rows, freeing them was most of the GUI thread's work. The handles'
+// counts are atomic, and nothing else holds these records any more.
+void AbstractContentModel::releaseRecords()
+{
+    if (m_released.isEmpty())
+        return;
+    auto *released = new QVector<Content>;
+    released->swap(m_released);
+    QThreadPool::globalInstance()->start([released]() { delete released; });
 }
 
 void AbstractContentModel::beginEdit()
@@ -426,6 +440,7 @@ void AbstractContentModel::endEdit()
 {
     if (--m_editDepth > 0)
         return;
+    releaseRecords();
     while (m_deferredFilter >= 0 || m_deferredRefilter) {
         if (m_deferredFilter >= 0) {
             const bool filtered = m_deferredFilter;

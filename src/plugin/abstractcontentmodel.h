@@ -88,11 +88,14 @@ private:
     Content &detachedRow(int index);
     void saveAttributes(const Content &row, const QVariantMap &attributes);
     void beginEdit();
+    void releaseRecords();
     void endEdit();
 
     SynchronizedContent m_content;
     SynchronizedContent m_filteredContent;
     QVector<Content> m_receivedContent;
+    // Records the view no longer holds, to be freed off the GUI thread.
+    QVector<Content> m_released;
     SynchronizedContent *m_currentContent;
     QueryAgent::Parameters *m_queuedQuery = nullptr;
     QueryRunner *m_queryRunner = nullptr;
