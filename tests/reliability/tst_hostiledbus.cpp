@@ -8,6 +8,7 @@
 #include "servicefixture.h"
 #include "sysroot.h"
 
+#include <QDBusArgument>
 #include <QDBusObjectPath>
 #include <QDBusVariant>
 #include <QRandomGenerator>
@@ -101,6 +102,16 @@ private slots:
             attack("setFavorite", { url, false });
         }
         // Unknown and known ids and types, with values that aren't what the keys want.
+        // Containers that the demarshalling must flatten or refuse: a structure, a map with integer keys.
+        QDBusArgument structure, intKeys;
+        structure.beginStructure();
+        structure << 1 << QString("s") << QDBusVariant(QVariantList { 2.5, "x" });
+        structure.endStructure();
+        intKeys.beginMap(QVariant::Int, qMetaTypeId<QDBusVariant>());
+        intKeys.beginMapEntry();
+        intKeys << 7 << QDBusVariant(QVariantMap { { "url", tone } });
+        intKeys.endMapEntry();
+        intKeys.endMap();
         const auto resource = [&](const QString &key, const QVariant &url) { return nested(1, QVariantMap { { key, QVariantMap { { "url", url } } } }); };
         const QList<QVariantMap> maps { {}, { { "displayName", 5 } }, { { "displayName", QString(100000, 'n') } }, { { "ringerVolume", 1e300 } },
             { { "ringerVolume", "60" } }, { { "highlightColor", "#12" } }, { { "homeWallpaper", keep } }, { { "url", "file://" + keep } },
@@ -109,7 +120,9 @@ private slots:
             { { "contentId", 1 }, { "type", 2 }, { "mimeType", "x/y" }, { "fileName", "../../x" } },
             { { "messageToneEnabled", QVariant::fromValue(QDBusVariant(true)) } }, { { "bytes", QByteArray(70000, '\0') } },
             // 21 levels of a{sv} are the deepest that the bus carries.
-            nested(10, 1), nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }) };
+            nested(10, 1), nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }),
+            { { "resources", QVariant::fromValue(structure) } }, { { "resources", QVariant::fromValue(intKeys) } },
+            nested(3, QVariant::fromValue(intKeys)) };
         for (int type : { -1, 0, 1, 2, 3, 4, 5, 6, 7, 8, 99, INT_MIN, INT_MAX }) {
             for (qlonglong id : { 0LL, -1LL, 1LL, m_themelet, m_file, m_themelet + 1000, LLONG_MAX, LLONG_MIN }) {
                 attack("remove", { type, id });
