@@ -87,7 +87,8 @@ private slots:
         QVERIFY(writeTree(m_sandbox + "/extra", { "images/aurora.jpg" }, "x"));
         QVERIFY(write(m_sandbox + "/extra/aurora.themelet", R"({"wallpaper": "aurora.jpg", "displayName": "Aurora"})"));
         QVERIFY(write(m_sandbox + "/loose/tone.ogg", "OggS") && write(m_sandbox + "/tones/bell #2.ogg", "OggS"));
-        QVERIFY(write(m_watched + "/notes.themelet", "{}"));
+        QVERIFY(write(m_watched + "/notes.themelet", "{}") && write(m_watched + "/mine/images/w.jpg", "x"));
+        QVERIFY(write(m_watched + "/mine/mine.themelet", R"({"wallpaper": "w.jpg"})"));
         QVERIFY(write(ProfileDefaults::path(),
                       "[themelet]\nringing.alert.volume=55\nringing.alert.tone=" + m_sandbox.toUtf8()
                               + "/tones/bell #2.ogg\nsms.alert.enabled=false\n"));
@@ -225,12 +226,12 @@ private slots:
 
     void createAndSet()
     {
-        // Blue beats a smaller red; a light grey one has no hue and gets dark text. The second gets a name of its own.
+        // Blue beats a smaller red; a pale pink one is too dull for a hue and gets dark text. The second gets a name of its own.
         QImage picture(320, 200, QImage::Format_RGB32);
         picture.fill(QColor(20, 40, 200));
         QPainter(&picture).fillRect(0, 0, 100, 100, Qt::red);
         QVERIFY(QDir().mkpath(m_sandbox + "/pictures/grey") && picture.save(m_sandbox + "/pictures/Blue Lagoon.png"));
-        picture.fill(QColor(200, 200, 200));
+        picture.fill(QColor(255, 210, 210));
         QVERIFY(picture.save(m_sandbox + "/pictures/grey/Blue Lagoon.png"));
 
         // Sounds come from the profile while no themelet is active; a "#" in a name is no URL fragment.
@@ -306,7 +307,10 @@ private slots:
         QTest::newRow("type without manager") << "remove" << QVariantList { 3, qlonglong(1) } << invalid;
         QTest::newRow("unknown id") << "saveAttributes" << QVariantList { 1, qlonglong(999999), QVariantMap() } << notFound;
         QTest::newRow("file is no themelet") << "remove" << QVariantList { 1, toneId } << notFound;
-        QTest::newRow("package themelet") << "remove" << QVariantList { 1, m_sunsetId } << "ReadOnly";
+        QTest::newRow("package themelet") << "remove" << QVariantList { 1, m_sunsetId } << "ReadOnly|belongs to a package";
+        // A user's own themelet: its picture is not the service's to delete.
+        QTest::newRow("user themelet") << "remove" << QVariantList { 1, query("SELECT id FROM file WHERE fileName = 'mine.themelet'")
+                                                                      .toLongLong() } << "ReadOnly|did not make";
         QTest::newRow("plain file") << "remove" << QVariantList { 0, toneId } << "Failed";
         QTest::newRow("bad colour") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "highlightColor", "reddish" } }) } << invalid;
         QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "ringerVolume", 1000 } }) } << invalid;
