@@ -31,6 +31,7 @@ TestCase {
     }
 
     SignalSpy { id: changedSpy; signalName: "changed" }
+    SignalSpy { id: typeSpy; signalName: "contentTypeChanged" }
 
     function initTestCase() {
         verify(Fixture.startService())
@@ -60,6 +61,10 @@ TestCase {
         info.url = nature + "none.themelet"
         compare(info.contentId, 0)
         compare(changedSpy.count, 1)
+        typeSpy.target = info
+        info.contentType = ContentInfo.Photo
+        info.contentType = ContentInfo.Photo
+        compare(typeSpy.count, 1)
     }
 
     // Only the changed leaf of the nested group goes, beside a changed plain property;

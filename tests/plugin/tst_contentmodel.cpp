@@ -134,7 +134,7 @@ private slots:
         QStringList log;
         FileModel model;
         logRows(&model, &log);
-        QSignalSpy status(&model, &AbstractContentModel::statusChanged);
+        QSignalSpy status(&model, &AbstractContentModel::statusChanged), count(&model, &AbstractContentModel::countChanged);
         const auto requery = [&]() {
             log.clear();
             model.requery();
@@ -147,6 +147,7 @@ private slots:
         QCOMPARE(status.count(), 1);
         QCOMPARE(displayNames(model), numbered(120));
         QVERIFY2(batched(log, "insert", 120), qPrintable(log.join(", ")));
+        QCOMPARE(count.count(), log.size());
 
         // Identical rows: refreshed in place, fresh records behind every row.
         const void *before = model.index(70, 0).internalPointer();
