@@ -8,35 +8,13 @@
 #include "profiledefaults.h"
 #include "sysroot.h"
 
-#include <QBuffer>
 #include <QPainter>
-#include <QXmlStreamReader>
 
 #include <memory>
 
 using namespace Fixture;
 
 namespace {
-
-// The elements of the service's interface in an introspection text, one line each with sorted attributes.
-QStringList interfaceOutline(const QString &xml)
-{
-    QStringList outline;
-    bool inside = false;
-    for (QXmlStreamReader reader(xml); !reader.atEnd();) {
-        if (reader.readNext() != QXmlStreamReader::StartElement)
-            continue;
-        if (reader.name() == QLatin1String("interface"))
-            inside = reader.attributes().value("name") == Service::Name;
-        QStringList attributes;
-        for (const QXmlStreamAttribute &attribute : reader.attributes())
-            attributes << attribute.name() + "=" + attribute.value();
-        attributes.sort();
-        if (inside)
-            outline << reader.name() + " " + attributes.join(' ');
-    }
-    return outline;
-}
 
 QVariant map(std::initializer_list<std::pair<QString, QVariant>> entries) { return QVariantMap(entries); }
 
@@ -96,22 +74,8 @@ private slots:
         // A first index half-made by a killed start is thrown away, never used.
         const QString halfMade = TestDatabase::indexPath() + ".new";
         QVERIFY(write(halfMade, "SQLite format 3"));
-        // A PNG that says it has 20000x20000 pixels: refused from its header, never decoded.
-        QByteArray png;
-        QBuffer buffer(&png);
-        QVERIFY(buffer.open(QIODevice::WriteOnly) && QImage(1, 1, QImage::Format_RGB32).save(&buffer, "png"));
-        QDataStream header(&png, QIODevice::ReadWrite);
-        header.device()->seek(16);
-        header << quint32(20000) << quint32(20000);
-        quint32 crc = 0xffffffff;
-        for (const char byte : png.mid(12, 17)) {
-            crc ^= quint8(byte);
-            for (int bit = 0; bit < 8; ++bit)
-                crc = (crc >> 1) ^ (0xedb88320 & (0 - (crc & 1)));
-        }
-        header.device()->seek(29);
-        header << ~crc;
-        QVERIFY(write(m_sandbox + "/bomb.png", png));
+        // A picture that says it has 20000x20000 pixels: refused from its header, never decoded.
+        QVERIFY(write(m_sandbox + "/bomb.ppm", "P6\n20000 20000\n255\n"));
         // A watched tree that holds the install paths is indexed whole; they keep their scopes.
         QVERIFY(write(Sysroot::path("/usr/share/doc/readme.txt"), "x"));
         // The system's sound theme: its sounds are tones, read-only.
@@ -133,16 +97,6 @@ private slots:
         if (const qint64 pid = Service::ownerPid())
             ::kill(pid_t(pid), SIGTERM);
         QVERIFY(QTest::qWaitFor([]() { return Service::ownerPid() == 0; }, 20000));
-    }
-
-    void introspection()
-    {
-        QDBusReply<QString> xml = Service::call("Introspect", {}, 30000, "org.freedesktop.DBus.Introspectable");
-        QFile contract(THEMELETD_XML);
-        QVERIFY(xml.isValid() && contract.open(QIODevice::ReadOnly));
-        const QStringList expected = interfaceOutline(QString::fromUtf8(contract.readAll()));
-        QVERIFY(expected.size() > 20);
-        QCOMPARE(interfaceOutline(xml.value()), expected);
     }
 
     // Each call changes rows and is announced by one contentChanged of its type (or more, from the loops);
@@ -167,8 +121,6 @@ private slots:
         QTest::newRow("saveAttributes, same values")
                 << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "displayName", "Dusk" }, { "favorite", true }, { "resources", tone } }) }
                 << "" << -1 << false << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
-        QTest::newRow("saveAttributes, empty") << "saveAttributes" << QVariantList { 1, m_sunsetId, QVariantMap() } << "" << -1 << false
-                                               << themelet << "Dusk|40|1|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
         QTest::newRow("setFavorite") << "setFavorite" << QVariantList { "file://" + m_package + "/images/sunset.jpg", false } << "true"
                                      << 1 << true << themelet << "Dusk|40|0|ringerToneFile=dusk.ogg,messageToneFile=tone.ogg";
         QTest::newRow("indexFile") << "indexFile" << QVariantList { "file://" + m_sandbox + "/loose/bell.ogg" } << "" << 0 << false
@@ -330,7 +282,7 @@ private slots:
         QTest::newRow("missing picture") << "createThemelet" << QVariantList { "file:///nonexistent.jpg" } << notFound;
         QTest::newRow("no picture") << "createThemelet" << QVariantList { "file://" + m_package + "/sunset.themelet" } << invalid;
         QTest::newRow("device") << "createThemelet" << QVariantList { "file:///dev/zero" } << invalid;
-        QTest::newRow("decompression bomb") << "createThemelet" << QVariantList { "file://" + m_sandbox + "/bomb.png" } << invalid + "|more pixels";
+        QTest::newRow("decompression bomb") << "createThemelet" << QVariantList { "file://" + m_sandbox + "/bomb.ppm" } << invalid + "|more pixels";
         QTest::newRow("directory") << "indexFile" << QVariantList { m_sandbox } << invalid;
     }
 
@@ -354,21 +306,20 @@ private slots:
         QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
     }
 
+    // A second instance leaves the index alone; a usage error is status 2, one line and a hint, as in themeletctl.
     void secondInstance()
     {
         const QDateTime modified = QFileInfo(TestDatabase::indexPath()).lastModified();
-        QProcess second;
-        second.start(THEMELETD_BINARY, { "--no-default-watch" });
-        QVERIFY(second.waitForFinished(20000));
-        QCOMPARE(second.exitCode(), 1);
-        QCOMPARE(second.readAllStandardError(),
-                 QByteArray("themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n"));
+        const QByteArray owned = "themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n";
+        for (const auto &run : { qMakePair(QStringList { "--no-default-watch" }, 1), qMakePair(QStringList { "-v", "--frob" }, 2) }) {
+            QProcess second;
+            second.start(THEMELETD_BINARY, run.first);
+            QVERIFY(second.waitForFinished(20000));
+            QCOMPARE(second.exitCode(), run.second);
+            QCOMPARE(second.readAllStandardError(), run.second == 1 ? owned
+                                                                     : "themeletd: Unknown option 'frob'.\nthemeletd: try 'themeletd --help'\n");
+        }
         QCOMPARE(QFileInfo(TestDatabase::indexPath()).lastModified(), modified);
-        // A usage error, as in themeletctl: exit status 2, one line and a hint.
-        second.start(THEMELETD_BINARY, { "-v", "--frob" });
-        QVERIFY(second.waitForFinished(20000));
-        QCOMPARE(second.exitCode(), 2);
-        QCOMPARE(second.readAllStandardError(), QByteArray("themeletd: Unknown option 'frob'.\nthemeletd: try 'themeletd --help'\n"));
     }
 
     void stopAndRestart()
