@@ -146,7 +146,6 @@ private slots:
                 bad + "t.index: files\\[3\\].fileName: no file 'gone.ogg' in .*/bad/t; ignored" }.join("\n[^\n]*") + "\nstderr: $");
         row({ "check", "--json", sandbox() + "/bad/b.themelet" }, 1, "^\\[\\s*.\\s*\"field\": \"\",\\s*\"file\": \".*/b.themelet\",\\s*\"problem\": \"invalid JSON");
         row({ "check", sandbox() + "/empty" }, 1, "nothing installable: no .themelet or .index file in it\nstderr: $");
-        row({ "check" }, 2, "usage: themeletctl check PATH");
         row({ "status" }, 1, "^service: +not running\ndatabase: +.*/themeletd.sqlite \\(missing\\)\nactive themelet: +none\nstderr: $");
         row({ "status", "--json" }, 1, R"(^\{\s*"activeThemelet": null,\s*"counts": \{\s*\},.*"exists": false,.*"running": false\s*\}\s*\}\n)");
     }
@@ -179,7 +178,6 @@ private slots:
         columns();
         row({ "set", "/x.themelet" }, 1, "^stderr: themeletctl: Unexpected reply signature: got \"s\", expected \"x\"\n$");
         row({ "refresh" }, 1, "^stderr: themeletctl: first second \\[2J\n$");
-        row({ "install", "/x" }, 1, "^stderr: themeletctl: .+\n$");
     }
 
     void hostileService()
@@ -219,14 +217,11 @@ private slots:
         row({ "show", sunset }, 0, "^type: themelet\ncontentId: " + m_id + "\n.*\ndisplayName: Sunset\n.*\nresources.ringerToneFile.url: " + P
                     + "/sounds/dusk.ogg\n.*\nactive: false\nstderr: $");
         row({ "show", "--json", "file://" + tones() + "/tones/bell.ogg" }, 0, R"("category": "Default",.*"displayName": "Bell",.*"readOnly": true,.*"type": "file")");
-        row({ "show", H + "/none.jpg" }, 1, "^stderr: themeletctl: not in the index: " + H + "/none.jpg\n$");
         row({ "status" }, 0, "^service: +running \\(pid \\d+\\)\ndatabase: .*\nschema version: +12\n.*pending: +0\nthemelets: +1\nphotos: +3\ntones: +3\nactive themelet: +none\nstderr: $");
         row({ "status", "--json" }, 0, R"(^\{\s*"activeThemelet": null,.*"pending": 0,.*"schemaVersion": 12\s*\},\s*"service": \{.*"pid": \d+,\s*"running": true)");
 
         row({ "create", H + "/photo1.jpg" }, 0, "^Created themelet \\d+: photo1 \\(" + created + "\\)\nstderr: $");
         row({ "create", "--json", H + "/photo2.jpg" }, 0, R"("displayName": "photo2",.*"readOnly": false,.*"type": "themelet")");
-        row({ "status", "--json" }, 0, R"("themelets": 3)");
-        row({ "create", H + "/none.jpg" }, 1, "^stderr: themeletctl: .+\n$");
         row({ "set", sunset }, 0, "^Active themelet " + m_id + ": Sunset \\(" + sunset + "\\)\nstderr: $");
         row({ "status", "--json" }, 0, "\"activeThemelet\": \"file://" + sunset + "\"");
         row({ "set", "--json", m_id }, 0, "\"active\": true,.*\"contentId\": " + m_id + ",");
@@ -241,12 +236,12 @@ private slots:
         row({ "index", S + "/elsewhere/new.jpg" }, 0, none);
         row({ "show", "--json", S + "/elsewhere/new.jpg" }, 0, R"("type": "photo",.*"width": 64)");
         row({ "remove", "themelet", created }, 0, none);
-        row({ "show", created }, 1, "^stderr: themeletctl: not in the index: ");
+        row({ "show", created }, 1, "^stderr: themeletctl: not in the index: " + created + "\n$");
         row({ "remove", "file", S + "/elsewhere/new.jpg" }, 2, "^stderr: themeletctl: a file can't be removed through themeletd: delete the file itself\n");
         row({ "install", S + "/extra" }, 0, none);
         row({ "show", "--json", S + "/extra/extra.themelet" }, 0, "\"displayName\": \"Extra\"");
         row({ "refresh" }, 0, none);
-        row({ "status", "--json" }, 0, "\"pending\": 0");
+        row({ "status", "--json" }, 0, "\"pending\": 0"); // settled: the monitors hear only their own changes
     }
 
     void withService() { verifyRow(); }
