@@ -72,20 +72,16 @@ TestCase {
         compare(column(filtered, "fileName"), "ab.jpg,abc.jpg")
         var filterSignals = 0
         model.nameFilterChanged.connect(function() { ++filterSignals })
-        var steps = [["", "b.jpg,ab.jpg,a.jpg,abc.jpg"], ["a", "ab.jpg,a.jpg,abc.jpg"], ["ab", "ab.jpg,abc.jpg"],
-                     ["", "b.jpg,ab.jpg,a.jpg,abc.jpg"]]
+        var steps = [["a", "ab.jpg,a.jpg,abc.jpg"], ["ab", "ab.jpg,abc.jpg"], ["", "b.jpg,ab.jpg,a.jpg,abc.jpg"]]
         for (var i = 0; i < steps.length; ++i) {
             model.nameFilter = steps[i][0]
-            compare(model.status, PhotoModel.Finished, steps[i][0])
-            compare(model.count, steps[i][1].split(",").length, steps[i][0])
-            compare(column(model, "fileName"), steps[i][1], steps[i][0])
+            compare([model.status, column(model, "fileName")], [PhotoModel.Finished, steps[i][1]], steps[i][0])
         }
         compare(filterSignals, 0) // declared, never emitted
 
         verify(Fixture.index(["photo", "abd.jpg"]))
         verify(Fixture.emitContentChanged(2))
-        tryCompare(filtered, "count", 3)
-        compare(column(filtered, "fileName"), "ab.jpg,abc.jpg,abd.jpg")
+        tryVerify(function() { return column(filtered, "fileName") === "ab.jpg,abc.jpg,abd.jpg" })
         filtered.nameFilter = ""
         compare(filtered.count, 5)
     }
@@ -115,7 +111,6 @@ TestCase {
         verify(Fixture.emitContentChanged(data.type))
         tryVerify(function() { return counts.join() === data.queried.join() })
         wait(200)
-        compare(counts, data.queried)
-        compare(models.map(function(model) { return model.status }), [2, 2, 2])
+        compare([counts, models.map(function(model) { return model.status })], [data.queried, [2, 2, 2]])
     }
 }

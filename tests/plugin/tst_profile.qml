@@ -23,10 +23,7 @@ TestCase {
 
     function created(properties) {
         var profile = createTemporaryObject(profileComponent, test, properties || {})
-        updatedSpy.target = volumeSpy.target = activeSpy.target = profile
-        updatedSpy.clear()
-        volumeSpy.clear()
-        activeSpy.clear()
+        ;[updatedSpy, volumeSpy, activeSpy].forEach(function(spy) { spy.target = profile; spy.clear() })
         return profile
     }
 
@@ -34,11 +31,8 @@ TestCase {
         Fixture.dconf(["write", profiles + "general/ringing.alert.tone", "'/sounds/ring.ogg'"])
         Fixture.dconf(["write", profiles + "general/sms.alert.enabled", "true"])
         var profile = created()
-        compare(profile.profile, Profile.General)
-        compare(profile.ringerToneFile, "/sounds/ring.ogg")
-        compare(profile.messageToneEnabled, true)
-        compare(profile.ringerVolume, 0)
-        compare(volumeSpy.count, 1)
+        compare([profile.profile, profile.ringerToneFile, profile.messageToneEnabled, profile.ringerVolume, volumeSpy.count],
+                [Profile.General, "/sounds/ring.ogg", true, 0, 1])
         Fixture.dconf(["write", profiles + "general/ringing.alert.volume", "40"])
         tryCompare(profile, "ringerVolume", 40)
     }
@@ -65,8 +59,7 @@ TestCase {
         Fixture.dconf(["write", profiles + "silent/ringing.alert.volume", "30"])
         Fixture.dconf(["write", profiles + "general/barrier.key", "'x'"])
         tryCompare(updatedSpy, "count", 1)
-        compare(volumeSpy.count, 0)
-        compare(profile.ringerVolume, 0)
+        compare([volumeSpy.count, profile.ringerVolume], [0, 0])
     }
 
     function test_activeProfile() {
@@ -76,7 +69,6 @@ TestCase {
         tryCompare(activeSpy, "count", 1)
         profile.activeProfile = Profile.Silent
         tryCompare(activeSpy, "count", 2)
-        compare(profile.activeProfile, Profile.Silent)
-        compare(profile.profile, Profile.Themelet)
+        compare([profile.activeProfile, profile.profile], [Profile.Silent, Profile.Themelet])
     }
 }
