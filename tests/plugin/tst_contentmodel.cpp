@@ -112,7 +112,6 @@ class tst_ContentModel : public QObject
 private slots:
     void initTestCase()
     {
-        MessageLog log(QStringList { "debug: DbManager::DbManager() Themelet DB Fine..." });
         QVERIFY(DbManager::instance().isOpen());
         m_db.reset(new TestDatabase);
     }
