@@ -127,6 +127,7 @@ private slots:
         FileModel model;
         logRows(&model, &log);
         QSignalSpy status(&model, &AbstractContentModel::statusChanged);
+        QSignalSpy count(&model, &AbstractContentModel::countChanged);
         const auto requery = [&]() {
             log.clear();
             model.requery();
@@ -139,6 +140,7 @@ private slots:
         QCOMPARE(status.count(), 1);
         QCOMPARE(displayNames(model), numbered(120));
         QVERIFY2(batched(log, "insert", 120), qPrintable(log.join(", ")));
+        QCOMPARE(count.count(), log.size());
 
         // Identical rows: refreshed in place, fresh records behind every row.
         const void *before = model.index(70, 0).internalPointer();

@@ -97,6 +97,8 @@ private slots:
         // A batch border inside a stretch: one refresh a pass, from the stretch's start.
         QTest::newRow("same rows, two batches") << "f1 f2 f3 f4" << "f1 f2 f3 f4" << QList<int> { 2, 2 }
                 << QStringList { "update 0 2 from 0", "update 2 2 from 2" };
+        QTest::newRow("one row replaced") << "f1 f2 f3" << "f1 f4 f3" << QList<int> { 3 }
+                << QStringList { "update 0 1 from 0", "remove 1 1", "insert 1 1 from 1", "update 2 1 from 2" };
         QTest::newRow("no anchor") << "f1 f2" << "f3 f4" << QList<int> { 2 } << QStringList { "remove 0 2", "insert 0 2 from 0" };
         // The first batch has no anchor: nothing moves until the next one brings it.
         QTest::newRow("anchor in a later batch") << "f1 f2" << "f3 f4 f1" << QList<int> { 2, 1 }
