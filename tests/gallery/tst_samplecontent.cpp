@@ -5,9 +5,6 @@
 
 #include <QCryptographicHash>
 #include <QDirIterator>
-#include <QJsonArray>
-#include <QJsonDocument>
-#include <QJsonObject>
 
 using namespace Fixture;
 
@@ -95,15 +92,8 @@ private slots:
         // Aurora's display name comes from its catalogue.
         QCOMPARE(rows("SELECT displayName, homeWallpaper, (SELECT count(*) FROM resource WHERE resource.fileId = themelet.fileId) "
                       "FROM themelet JOIN file ON id = fileId ORDER BY displayName"), themelets.mid(1));
-        QFile index(m_root + "/usr/share/sounds/orbaline/tones.index");
-        QVERIFY(index.open(QIODevice::ReadOnly));
-        QStringList categories;
-        for (const QJsonValue entry : QJsonDocument::fromJson(index.readAll()).object().value("files").toArray())
-            categories << entry["fileName"].toString() + '=' + entry["category"].toString();
-        categories.sort();
-        QCOMPARE(categories.size(), 10);
-        QCOMPARE(m_db.rows("SELECT fileName || '=' || category FROM file JOIN directory ON directory.id = directoryId WHERE path = '"
-                           + m_root + "/usr/share/sounds/orbaline/tones' ORDER BY fileName"), categories);
+        QCOMPARE(rows("SELECT category, count(*) FROM file JOIN directory ON directory.id = directoryId WHERE path = '"
+                      + m_root + "/usr/share/sounds/orbaline/tones' GROUP BY category"), QString("Alarm|2;Customer|2;Default|2;Ringtone|4"));
     }
 };
 

@@ -71,26 +71,23 @@ public:
 
     QVariantList calls;
     qlonglong replyId = 0;
-    QString errorMessage; // answers createThemelet, setThemelet, remove and saveAttributes with an error when set
+    QString errorMessage; // answers every call with an error when set
 
 public slots:
-    qlonglong createThemelet(const QString &url) { return record({ "createThemelet", url }, true); }
-    void indexFile(const QString &url) { record({ "indexFile", url }); }
-    void installPackage(const QString &path) { record({ "installPackage", path }); }
-    void refreshThemelets() { record({ "refreshThemelets" }); }
-    void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }, true); }
+    // The calls the module makes; the CLI's tests cover the others against the real service.
+    qlonglong createThemelet(const QString &url) { return record({ "createThemelet", url }); }
+    void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }); }
     void saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)
     {
-        record({ "saveAttributes", contentType, contentId, plain(args) }, true);
+        record({ "saveAttributes", contentType, contentId, plain(args) });
     }
-    qlonglong setThemelet(const QString &url) { return record({ "setThemelet", url }, true); }
-    bool setFavorite(const QString &url, bool value) { return record({ "setFavorite", url, value }) != 0; }
+    qlonglong setThemelet(const QString &url) { return record({ "setThemelet", url }); }
 
 private:
-    qlonglong record(const QVariantList &call, bool mayFail = false)
+    qlonglong record(const QVariantList &call)
     {
         calls.append(QVariant(call));
-        if (mayFail && !errorMessage.isEmpty())
+        if (!errorMessage.isEmpty())
             sendErrorReply(QStringLiteral("com.vorka.themeletd.Error"), errorMessage);
         return replyId;
     }

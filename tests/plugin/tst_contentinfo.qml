@@ -20,6 +20,7 @@ TestCase {
             property color highlightColor
             property bool favorite
             property string notARole: "kept"
+            readonly property int typeSeen: contentType
             // A map-valued role, two levels deep.
             readonly property QtObject resources: QtObject {
                 readonly property QtObject ringerToneFile: QtObject {
@@ -52,7 +53,6 @@ TestCase {
         changedSpy.target = info
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
-        verify(info.contentId > 0)
         compare([info.displayName, info.highlightColor, info.favorite, info.notARole], ["Aurora", "#ffcc66", true, "kept"])
         compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
         compare(String(info.resources.ringerToneFile.url), nature + "sounds/dusk.ogg")
@@ -67,38 +67,25 @@ TestCase {
         compare(typeSpy.count, 1)
     }
 
-    // Only the changed leaf of the nested group goes, beside a changed plain property;
-    // the local values stay until the next load.
-    function test_saveNestedLeaf() {
-        var info = loaded("aurora")
+    // A load writes every bound property; none of that is a change to save. Of a nested
+    // group only the changed leaf goes; the local values stay until the next load.
+    function test_save() {
+        var info = loaded("forest")
+        info.save()
+        info.contentId = loaded("aurora").contentId
+        compare(info.url, nature + "aurora.themelet")
+        info.save()
         info.resources.ringerToneFile.url = "file:///tones/new.ogg"
         info.highlightColor = "#80112233"
         info.save()
         compare(Fixture.takeCalls(1), [["saveAttributes", 1, info.contentId, {
             resources: { ringerToneFile: { url: "file:///tones/new.ogg" } }, highlightColor: "#80112233" }]])
         compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
-    }
-
-    // A load writes every bound property; none of that is a change to save.
-    function test_loadIsNotAChange() {
-        var info = loaded("aurora")
-        info.save()
-        info.contentId = loaded("forest").contentId
-        compare(info.displayName, "Forest")
-        compare(info.url, nature + "forest.themelet")
-        info.save()
-        info.displayName = "Woods"
-        info.save()
-        compare(Fixture.takeCalls(1), [["saveAttributes", 1, info.contentId, { displayName: "Woods" }]])
-    }
-
-    // A change notice of the item's type loads again and drops what wasn't saved.
-    function test_reloadDropsChanges() {
-        var info = loaded("forest")
-        info.displayName = "Woods"
+        // A change notice of the item's type loads again and drops what wasn't saved.
+        info.displayName = "Dawn"
         verify(Fixture.emitContentChanged(0))
         verify(Fixture.emitContentChanged(1))
-        tryCompare(info, "displayName", "Forest")
+        tryCompare(info, "displayName", "Aurora")
         info.save()
         compare(Fixture.takeCalls(), [])
     }
@@ -116,5 +103,7 @@ TestCase {
         verify(Fixture.emitContentChanged(1))
         wait(200)
         compare(info.contentId, 0)
+        info.contentType = ContentInfo.Photo
+        compare(info.typeSeen, ContentInfo.Photo)
     }
 }
