@@ -8,7 +8,7 @@
 // batch; at the end the old list must equal it, and no edit may reach past
 // either list or refresh a row with another item.
 #include "fuzzsupport.h"
-#include "synchronizedcontent.h"
+#include "recordinglist.h"
 
 #include <QUrl>
 
@@ -16,39 +16,15 @@
 
 namespace {
 
-bool outside(int index, int count, int size) { return count >= 1 && (index < 0 || index + count > size); }
-
-// Forwards the edits to the list and checks each one first.
-class Checker : public SynchronizationInterface
+// Stops at the first bad edit, before it is applied.
+struct Checker : RecordingList
 {
-public:
-    explicit Checker(SynchronizedContent &list) : m_list(list) {}
-
-    void insertRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
+    bool note(const QString &operation, bool inRange) override
     {
-        if (outside(index, count, m_list.size() + count) || outside(sourceIndex, count, source.size()))
-            Fuzz::fail(QStringLiteral("insertRange out of bounds"));
-        m_list.insertRange(index, count, source, sourceIndex);
+        if (!inRange)
+            Fuzz::fail(QStringLiteral("an edit out of bounds or over another item: ") + operation);
+        return true;
     }
-    void removeRange(int index, int count) override
-    {
-        if (outside(index, count, m_list.size()))
-            Fuzz::fail(QStringLiteral("removeRange out of bounds"));
-        m_list.removeRange(index, count);
-    }
-    void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
-    {
-        if (outside(index, count, m_list.size()) || outside(sourceIndex, count, source.size()))
-            Fuzz::fail(QStringLiteral("updateRange out of bounds"));
-        for (int i = 0; i < count; ++i) {
-            if (m_list.at(index + i) != source.at(sourceIndex + i))
-                Fuzz::fail(QStringLiteral("updateRange over another item"));
-        }
-        m_list.updateRange(index, count, source, sourceIndex);
-    }
-
-private:
-    SynchronizedContent &m_list;
 };
 
 }
@@ -58,12 +34,12 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
     if (size < 2 || size > 4096)
         return 0;
     const size_t oldSize = qMin<size_t>(data[0], size - 2);
-    SynchronizedContent list;
+    Checker checker;
+    SynchronizedContent &list = checker.list;
     QVector<Content> source;
     for (size_t i = 2; i < size; ++i)
         (i < 2 + oldSize ? static_cast<QVector<Content> &>(list) : source).append(Content(new FileData(data[i] & 0x1f, QUrl())));
 
-    Checker checker(list);
     if (data[1] & 0x80) {
         int index = 0, sourceIndex = 0;
         SynchronizedContent::walk(list, source, index, sourceIndex, &checker, false);

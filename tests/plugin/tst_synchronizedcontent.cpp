@@ -1,7 +1,7 @@
 // SPDX-FileCopyrightText: 2026 The themelet authors
 // SPDX-License-Identifier: LGPL-2.1-or-later
 
-#include "synchronizedcontent.h"
+#include "recordinglist.h"
 
 #include <QRandomGenerator>
 #include <QtTest>
@@ -30,39 +30,8 @@ QString names(const QVector<Content> &list)
     return result.join(' ');
 }
 
-// Applies each edit to its list and writes it down; an edit out of range, or a
-// refresh of rows that aren't the same, makes it invalid.
-struct RecordingAgent : SynchronizationInterface
+struct RecordingAgent : RecordingList
 {
-    SynchronizedContent list;
-    QStringList operations;
-    bool valid = true;
-
-    bool note(const QString &operation, bool inRange)
-    {
-        operations << operation;
-        return valid = valid && inRange;
-    }
-    void insertRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
-    {
-        if (note(QStringLiteral("insert %1 %2 from %3").arg(index).arg(count).arg(sourceIndex),
-                 count > 0 && index >= 0 && index <= list.size() && sourceIndex >= 0 && sourceIndex + count <= source.size()))
-            list.insertRange(index, count, source, sourceIndex);
-    }
-    void removeRange(int index, int count) override
-    {
-        if (note(QStringLiteral("remove %1 %2").arg(index).arg(count), count > 0 && index >= 0 && index + count <= list.size()))
-            list.removeRange(index, count);
-    }
-    void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex) override
-    {
-        bool same = count > 0 && index >= 0 && index + count <= list.size() && sourceIndex >= 0 && sourceIndex + count <= source.size();
-        for (int i = 0; same && i < count; ++i)
-            same = list.at(index + i) == source.at(sourceIndex + i);
-        if (note(QStringLiteral("update %1 %2 from %3").arg(index).arg(count).arg(sourceIndex), same))
-            list.updateRange(index, count, source, sourceIndex);
-    }
-
     // Delivers `source` in growing batches of these sizes, the rest at the end of the query.
     void mergeInBatches(const QVector<Content> &source, const QList<int> &batches)
     {
