@@ -42,7 +42,6 @@ private slots:
         for (const auto &[a, b, equal] : cases)
             QCOMPARE(QVector<bool>({ a == b, b == a, !(a != b) }), QVector<bool>(3, equal));
         QVERIFY(!null.isValid() && !null.data() && int(null.type()) == -1 && file.isValid());
-        static_assert(std::is_same_v<std::underlying_type_t<ThemeletContent::Type>, int>, "numbers from the bus are values");
         const Content themelet(record<ThemeletData>());
         QVERIFY(Themelet(file).isNull() && Themelet(null).isNull() && Themelet(themelet).constData() == themelet.data());
         // Assigned through an alias of the only handle: the record survives its own replacement.

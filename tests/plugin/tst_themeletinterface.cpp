@@ -79,7 +79,6 @@ private slots:
         QTest::newRow("set") << false << recorder << qlonglong(12) << "" << "[[12]]" << "";
         // Above 2^53 a double can't hold every id.
         QTest::newRow("create, large id") << true << recorder << (Q_INT64_C(1) << 53) + 1 << "" << "[[9007199254740992]]" << "";
-        QTest::newRow("no callback") << false << "" << qlonglong(1) << "refused" << "[]" << "";
         QTest::newRow("an object") << true << "({})" << qlonglong(1) << "refused" << "[]" << "";
         QTest::newRow("refused") << true << recorder << qlonglong(1) << "no such file" << "[]" << "Error creating themelet: no such file";
         QTest::newRow("no service") << false << recorder << qlonglong(1) << "absent" << "[]"
