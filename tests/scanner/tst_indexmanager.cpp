@@ -128,10 +128,6 @@ private slots:
         QTest::ignoreMessage(QtWarningMsg, qPrintable("Skipping a directory that is a symbolic link \"" + tones() + '"'));
         QVERIFY(indexes->updateMetaData());
         QCOMPARE(m_db.fileRows(tones(), "fileName"), QStringList { "a.ogg" });
-        // A sparse giant is not read into memory; the rows stay.
-        QVERIFY(QFile::resize(index, 5 << 20) && m_db.exec(markStale));
-        QTest::ignoreMessage(QtWarningMsg, qPrintable("Skipping a file of more than 4194304 bytes \"" + index + '"'));
-        QVERIFY(indexes->updateMetaData());
         QVERIFY(QFile::remove(index) && ::mkfifo(QFile::encodeName(index).constData(), 0644) == 0);
         QVERIFY(m_db.exec(markStale) && indexes->updateMetaData());
     }
