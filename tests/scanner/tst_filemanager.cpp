@@ -284,30 +284,21 @@ private slots:
             QCOMPARE(row, row.section('|', 0, 0) + '|' + database.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
     }
 
-    // A picture that lands in a watched directory, followed by the service's own
-    // loop: the event gives a stale file row, a later step reads the picture.
+    // A new directory and a picture in one read: the next loop step scans the directory, a later one reads the picture.
     void roadOfChange()
     {
-        const QString pictures = uniquePath(), shot = pictures + ".jpg";
-        QVERIFY(QDir().mkpath(pictures));
-        QVERIFY(writeJpeg(shot, { "set Exif.Photo.DateTimeOriginal 2014:05:01 12:00:00", "set Exif.Image.Orientation 6" }));
+        const QString pictures = uniquePath();
         FileManager *manager = FileManager::instance();
-        QVERIFY(manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
+        QVERIFY(QDir().mkpath(pictures) && manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0);
+        QVERIFY(waitIdle() && write(pictures + "/new/a") && writeJpeg(pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
         SignalRecorder::clear();
-
-        // The read alone, as the loop would deliver it: the steps it posts haven't run yet.
-        // A new directory comes with it: its scan takes the next step, the picture waits.
-        QVERIFY(write(pictures + "/new/a") && QFile::rename(shot, pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
         QEvent read(QEvent::SockAct);
         QCoreApplication::sendEvent(manager, &read);
-        const QString state = "SELECT fileName, mimeType, permissions, metadataCurrent, width, height, dateTaken, orientation "
-                              "FROM file LEFT JOIN image ON fileId = id WHERE fileName = 'shot.jpg'";
-        QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|0|NULL|NULL|NULL|NULL" });
         QCoreApplication::sendPostedEvents(manager, QEvent::UpdateRequest);
         QCOMPARE(m_sql.rows("SELECT fileName, metadataCurrent FROM file ORDER BY fileName"), (QStringList { "a|0", "shot.jpg|0" }));
         QVERIFY(waitIdle());
         QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 0, 2 }));
-        QCOMPARE(m_sql.rows(state), QStringList { "shot.jpg|image/jpeg|3|1|64|48|2014-05-01T12:00:00.000|6" });
+        QCOMPARE(m_sql.rows("SELECT metadataCurrent, width FROM file JOIN image ON fileId = id"), QStringList { "1|64" });
     }
 };
 
