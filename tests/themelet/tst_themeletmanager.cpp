@@ -113,10 +113,8 @@ private slots:
         add("only wallpaper", R"("w.jpg")", defaults);
         add("slash in wallpaper", R"("images/w.jpg")", "");
         add("missing wallpaper file", R"("gone.jpg")", "");
-        add("wallpaper ..", R"("..")", "");
         add("wallpaper a directory", R"("images")", "");
         add("wallpaper linked out of the package", R"("out.jpg")", "");
-        add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|NULL|NULL|NULL|now");
         add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
             R"("timestamp": "2014-05-01T12:00:00.250Z", "displayName": "Edge", "highlightColor": "#112233", )"
             R"("secondaryHighlightColor": "#445566", "primaryColor": "#778899", "secondaryColors": "#80aabbcc")",
@@ -129,13 +127,11 @@ private slots:
             { "ringerToneFile|fallback-ringer.ogg" });
         add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|NULL|NULL|NULL|now");
         add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
-        add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
         add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
             R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
         add("unpaired surrogates", R"("w.jpg", "partnerSpace": "a\ud800b\udc00")", "1|80|-1|1|NULL|NULL|NULL|NULL|a\uFFFDb\uFFFD|now");
-        add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
-            R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"
+            R"("highlightColor": {"a": 1}, "ringerVolume": 60.5, "partnerSpace": 7, "timestamp": "yesterday", "version": "3", )"
             R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|NULL|NULL|NULL|now");
     }
 
@@ -165,7 +161,7 @@ private slots:
 
     void malformed_data()
     {
-        QTest::addColumn<QByteArray>("content");   // "<missing>", "<fifo>": a file that can't be opened
+        QTest::addColumn<QByteArray>("content");   // "<fifo>": a file that would block
         QTest::addColumn<int>("volume");           // of the bad file's row, 0 for none
         QTest::addColumn<QStringList>("warnings"); // patterns of the records, in order
         QTest::addColumn<QStringList>("files");    // fileName|ringerVolume|metadataCurrent afterwards
@@ -173,20 +169,14 @@ private slots:
                 + "/bad\\.themelet\" , jsonError: %1 , jsonOffset: %2$";
         const QStringList deleted { "bad.themelet|NULL|1", "good.themelet|42|1" };
         QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
-        QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
-                                   << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
-        // Valid, but too large to be read: unreadable like a missing file, not malformed.
+        // Valid, but too large to be read: unreadable, not malformed. Having a row, it sends the merge's
+        // later entries to the inserts, which fail on the key.
         QTest::newRow("too large, with a row") << QByteArray(R"({"wallpaper": "w.jpg"})").append(4 << 20, ' ') << 41
                 << QStringList { "^Skipping a file of more than 4194304 bytes \"" + QRegularExpression::escape(package("bad")) + "/bad\\.themelet\"$" }
                         + failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
                                   "INSERT INTO themelet ( fileId,")
                 << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
         QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
-        // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
-        QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
-                << failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
-                           "INSERT INTO themelet ( fileId,")
-                << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
     }
 
     // Bad input doesn't hold up the file after it in the batch.
@@ -198,10 +188,8 @@ private slots:
         QFETCH(QStringList, files);
         const qint64 bad = addThemelet("bad", content);
         const QString path = package("bad") + "/bad.themelet";
-        if (content.startsWith('<'))
-            QFile::remove(path);
         if (content == "<fifo>")
-            QCOMPARE(::mkfifo(QFile::encodeName(path).constData(), 0644), 0);
+            QVERIFY(QFile::remove(path) && ::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
         // The good file's row shows that the merge passes over a deleted one.
         const qint64 good = addThemelet("good", R"({"wallpaper": "w.jpg"})");
         m_db.exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, 42)").arg(good));
