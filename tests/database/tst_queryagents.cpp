@@ -48,8 +48,7 @@ QVariantMap resource(const QString &path)
     return { { "url", QUrl::fromLocalFile(path) }, { "fileName", file.fileName() }, { "displayName", file.completeBaseName() } };
 }
 
-// Run as an unprivileged user on an index that it may read but not write
-// beside: what the file agent of its thread sees, and whether "-shm" appeared.
+// As an unprivileged user, on an index it can't write beside: the file agent's rows, and whether "-shm" appeared.
 int readOnlyChild()
 {
     QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::File);
@@ -131,8 +130,7 @@ private slots:
 
     void agentFor()
     {
-        // On each of two threads, per call: the connection's number and the size
-        // of the agent's role table; then whether a second call gives the same agent.
+        // Per thread and call: the connection's number and the agent's role count; then whether an agent is reused.
         QStringList seen[2];
         for (QStringList &calls : seen) {
             std::thread([&calls] {
@@ -163,8 +161,7 @@ private slots:
     {
         if (geteuid() != 0)
             QSKIP("needs root to switch to an unprivileged user");
-        // A copy of the index made while a writer held a row in the write-ahead
-        // log, in a directory that the user can't write.
+        // A copy made while a writer held a row in the write-ahead log, in a directory the user can't write.
         const QString sandbox = qEnvironmentVariable("THEMELET_SANDBOX");
         const QString staging = sandbox + "/staging.sqlite";
         const QString target = sandbox + "/rodata/system/privileged/Themeletd/themeletd.sqlite";
@@ -300,9 +297,8 @@ private slots:
 
     void batches()
     {
-        // Resources on the 50th and 51st: the first batch ends with the 50th's,
-        // the second starts with the cursor on the 51st's. A resource whose file
-        // is gone doesn't stop the merge.
+        // Resources on the 50th and 51st: a batch ends with the 50th's, the next starts on the 51st's.
+        // A resource whose file is gone doesn't stop the merge.
         QFETCH(QList<int>, sizes);
         const int rows = std::accumulate(sizes.cbegin(), sizes.cend(), 0);
         QStringList names;

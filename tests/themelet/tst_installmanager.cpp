@@ -18,8 +18,7 @@ private slots:
 
     void scanMerge()
     {
-        // Packages a, b and r on disk; rows b, c, y and z as an earlier run left
-        // them, and r known as a root of its own, which is adopted with its id.
+        // Packages a, b and r on disk; rows b, c, y and z from an earlier run, and r a root of its own, adopted with its id.
         const QString installDir = uniquePath();
         QVERIFY(writeTree(installDir, { "a/a.index", "b/b.index", "r/r.index" }, "{}"));
         QVERIFY(m_db.exec(QStringLiteral("INSERT INTO directory (path, scope) VALUES ('%1', 1), ('%1/r', 0)").arg(installDir)));
@@ -32,11 +31,9 @@ private slots:
                                                 "directory.id) FROM directory WHERE parentId = %2 ORDER BY path")
                                          .arg(installDir.size() + 2).arg(parentId);
 
-        // New r uses up the list in front of row y, which is left for the next
-        // scan; z, behind it, goes at once. Every package is installed, new or known.
-        // Step by step, with a second directory queued: both scans, then each
-        // package in the order found, then the reading of the indexes.
-        // Also a name that isn't UTF-8, a broken index and a package that vanishes while queued.
+        // New r uses up the list in front of row y, left for the next scan; z, behind it, goes at once. With a second
+        // directory queued: both scans, each package in the order found, then the indexes (one broken) are read.
+        // Also a name that isn't UTF-8 and a package that vanishes while queued.
         QVERIFY(write(installDir + "-2/s/s.index", "{\"files\": [") && write(installDir + "/v/v.index", "{}"));
         QVERIFY(::mkdir((QFile::encodeName(installDir) + "/bad\xff\xfe").constData(), 0755) == 0);
         QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^Error parsing index from file .*/s.index"));
@@ -79,8 +76,7 @@ private slots:
         // As if read, and as if a writable row had been left behind.
         const QString markRead = "UPDATE file SET metadataCurrent = 1, permissions = 3 WHERE directoryId = " + m_db.directoryId(package);
 
-        // Unchanged, also seen from another time zone: nothing to update, but the
-        // ZEF id is bound; an empty one keeps it.
+        // Unchanged, also from another time zone: nothing to update, but the ZEF id is bound; an empty one keeps it.
         const QByteArray zone = qgetenv("TZ");
         setTimeZone("America/St_Johns");
         QVERIFY(m_db.exec(markRead) && installer()->install(package, QStringLiteral("Z1"), false));

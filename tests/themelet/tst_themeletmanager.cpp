@@ -40,8 +40,7 @@ class tst_ThemeletManager : public QObject
     ThemeletManager *m_manager = nullptr;
     TestDatabase m_db { serviceIndex() };
 
-    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), images/out.jpg
-    // and sounds/out.ogg linked to a file outside, unread row.
+    // Package <name>: images/w.jpg, sounds/dusk.ogg, both also one level deeper, out.jpg and out.ogg linked outside.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
         writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
@@ -82,8 +81,7 @@ private slots:
 
     void translation()
     {
-        // One batch in directory order. After a file without a catalogue the same catalogue stays off.
-        // A path is no catalogue, even one that leads to the right place.
+        // One batch: after a file without a catalogue that catalogue stays off; a path is no catalogue.
         const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset",
                                      "../translations/themelet-sunset" };
         for (int i = 0; i < catalogs.size(); ++i)
@@ -167,8 +165,7 @@ private slots:
                 + "/bad\\.themelet\" , jsonError: %1 , jsonOffset: %2$";
         const QStringList deleted { "bad.themelet|NULL|1", "good.themelet|42|1" };
         QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
-        // Valid, but too large to be read: unreadable, not malformed. Having a row, it sends the merge's
-        // later entries to the inserts, which fail on the key.
+        // Too large to read, not malformed; with a row, the merge's later entries go to the inserts and fail on the key.
         QTest::newRow("too large, with a row") << QByteArray(R"({"wallpaper": "w.jpg"})").append(4 << 20, ' ') << 41
                 << QStringList { "^Skipping a file of more than 4194304 bytes \"" + QRegularExpression::escape(package("bad")) + "/bad\\.themelet\"$" }
                         + failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
@@ -289,8 +286,7 @@ private slots:
         QCOMPARE(SignalRecorder::calls(), QList<int>()); // the caller tells the clients
     }
 
-    // A setter emits nothing: the signal comes once the store reports the change, also one made by another process.
-    // Runs before any other function here writes the keys.
+    // A setter emits nothing: the signal comes from the store, also for another process's change. Keys untouched so far.
     void settings()
     {
         ThemeletSettings settings;
@@ -367,7 +363,8 @@ private slots:
         // A url that names no local file moves nothing.
         data->url = QUrl("http://example.com/moved.themelet");
         QTest::ignoreMessage(QtWarningMsg, "qint64 ThemeletManager::create(const Themelet&)");
-        QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id).arg(data->url.toString())));
+        QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id)
+                                                      .arg(data->url.toString())));
         QCOMPARE(m_manager->create(themelet), 0);
         QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
         // Nothing to act on: no themelet, no file, an unknown id.
