@@ -102,8 +102,7 @@ private slots:
         QFETCH(int, version);
         QFETCH(QString, flags);
 
-        // The old files stay open, so that the new ones can't take their inodes;
-        // an old connection in write-ahead mode keeps "-shm" and "-wal" there.
+        // Old files stay open so that new ones can't take their inodes; a WAL connection keeps "-shm" and "-wal".
         std::unique_ptr<TestDatabase> old;
         QFile blocker(schema == SystemIsAFile ? m_system : m_path);
         if (schema == SystemIsAFile || schema == NotADatabase) {
@@ -113,9 +112,8 @@ private slots:
             old.reset(new TestDatabase);
             old->exec({ "PRAGMA journal_mode = WAL;", "CREATE TABLE notes ( text TEXT);" });
         } else if (schema != NoFile) {
-            // A current index taken back to `schema` (7 lacks themelet.partnerSpace, 8 and 9
-            // themelet.version, 10 and 11 file.category), with three files in a plain
-            // directory and two in a package, all read.
+            // A current index taken back to `schema` (7 lacks themelet.partnerSpace, 8 and 9 themelet.version,
+            // 10 and 11 file.category); three files in a plain directory and two in a package, all read.
             MessageLog quiet(false);
             QVERIFY(DbManager().isOpen());
             old.reset(new TestDatabase);
@@ -172,8 +170,7 @@ private slots:
 
     void failedRebuild()
     {
-        // A directory at the file's path: the version can't be read, the removal
-        // fails, and so does the schema of the rebuild. One nuke only, then closed.
+        // A directory at the file's path: reading the version, removal and rebuild fail. One nuke, then closed.
         QVERIFY(QDir().mkpath(m_path));
         MessageLog capture(false);
         QVERIFY(!DbManager().isOpen());
@@ -203,8 +200,7 @@ private slots:
         // A file takes its rows along, and the resources naming it.
         db.exec("DELETE FROM file WHERE id = 4;");
         QCOMPARE(db.rows(state), QStringList { "1 2 3 4|1 2 3 5|1 5|1 5|1 5|1 5|5r1 2r3" });
-        // A directory takes its files and its children, not its grandchildren
-        // nor the files of its children.
+        // A directory takes its files and its children, not its grandchildren nor its children's files.
         db.exec("DELETE FROM directory WHERE id = 1;");
         QCOMPARE(db.rows(state), QStringList { "3 4|2 3 5|5|5|5|5|2r3" });
     }

@@ -3,6 +3,7 @@
 
 #include "indexfixture.h"
 
+#include "downloadmanager.h"
 #include "imagemanager.h"
 
 #include <sys/stat.h>
@@ -41,7 +42,6 @@ private slots:
         QTest::newRow("webp") << "webp" << "64|48|NULL|NULL" << QStringList();
         QTest::newRow("svg") << "svg" << "64|48|NULL|NULL" << QStringList();
         QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
-        QTest::newRow("vanished") << "vanished" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("no directory row") << "orphan" << "-1|-1|NULL|NULL" << QStringList();
         // A failed step leaves its rows stale for the next one.
@@ -67,7 +67,7 @@ private slots:
             QVERIFY(write(path, QByteArray(2048, 'x')));
         else if (damage == "fifo")
             QVERIFY(::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
-        else if (damage != "vanished")
+        else
             QVERIFY(writeJpeg(path, { "set Xmp.exif.DateTimeOriginal 2015-06-02T08:30:00", "set Xmp.tiff.Orientation 3",
                                       "set Exif.Image.Orientation 6" }));
         m_sql.exec({ QString("INSERT INTO file (id, directoryId, mimeType, fileName, permissions, metadataCurrent) "
@@ -118,6 +118,27 @@ private slots:
         }
         QCOMPARE(stale(), 5);
         QCOMPARE(m_sql.value("SELECT COUNT(*) FROM image WHERE width = 64 AND height = 48;").toInt(), count);
+    }
+
+    // Download records are kept by the same side of the index.
+    void downloads()
+    {
+        m_sql.exec({ "DELETE FROM download;", "INSERT INTO download VALUES (1, 'http://old.example/a.jpg');" });
+        const auto source = [this] { return m_sql.rows("SELECT source FROM download;"); };
+        QVERIFY(dynamic_cast<DownloadManager *>(ContentManager::managerFromType(4)));
+        for (int type : { 3, 5, 8, -1 })
+            QVERIFY2(!ContentManager::managerFromType(type), qPrintable(QString::number(type)));
+        DownloadManager manager(DbManager::instance());
+        QVERIFY(manager.save(1, { { "Source", QUrl("http://new.example/b.jpg") } })); // only "source" counts
+        // remove(int) hides the virtual remove(qint64) instead of overriding it.
+        QVERIFY(!static_cast<ContentManager &>(manager).remove(qint64(1)));
+        QCOMPARE(source(), QStringList { "http://old.example/a.jpg" });
+        QVERIFY(manager.save(1, { { "source", QUrl("http://new.example/b.jpg") } }));
+        QCOMPARE(source(), QStringList { "http://new.example/b.jpg" });
+        QVERIFY(manager.save(1, { { "source", 42 } })); // not a URL: an empty one
+        QCOMPARE(source(), QStringList { "" });
+        QVERIFY(manager.remove(1));
+        QCOMPARE(source(), QStringList());
     }
 };
 

@@ -14,8 +14,6 @@ using namespace Fixture;
 static const QString s_resources = "SELECT resourceType, fileName FROM resource JOIN file ON resourceId = file.id ORDER BY resourceType";
 
 static const QString s_sourceKey = QStringLiteral("/desktop/lunda/background/portrait/picture_filename");
-static const QString s_applicationKey = QStringLiteral("/desktop/vorka/background/portrait/app_picture_filename");
-static const QString s_homeKey = QStringLiteral("/desktop/vorka/background/portrait/home_picture_filename");
 
 static QString package(const QString &name) { return Sysroot::path(QStringLiteral("/usr/share/themelet/")) + name; }
 static QString user(const QString &name) { return qEnvironmentVariable("THEMELET_SANDBOX") + "/user/" + name; }
@@ -42,8 +40,7 @@ class tst_ThemeletManager : public QObject
     ThemeletManager *m_manager = nullptr;
     TestDatabase m_db { serviceIndex() };
 
-    // Package <name>: images/w.jpg, sounds/dusk.ogg, both one level deeper (only "/" rejects those), images/out.jpg
-    // and sounds/out.ogg linked to a file outside, unread row.
+    // Package <name>: images/w.jpg, sounds/dusk.ogg, both also one level deeper, out.jpg and out.ogg linked outside.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
         writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
@@ -84,8 +81,7 @@ private slots:
 
     void translation()
     {
-        // One batch in directory order. After a file without a catalogue the same catalogue stays off.
-        // A path is no catalogue, even one that leads to the right place.
+        // One batch: after a file without a catalogue that catalogue stays off; a path is no catalogue.
         const QStringList catalogs { "themelet-gone", "themelet-sunset", "themelet-sunset", "", "themelet-sunset",
                                      "../translations/themelet-sunset" };
         for (int i = 0; i < catalogs.size(); ++i)
@@ -113,10 +109,8 @@ private slots:
         add("only wallpaper", R"("w.jpg")", defaults);
         add("slash in wallpaper", R"("images/w.jpg")", "");
         add("missing wallpaper file", R"("gone.jpg")", "");
-        add("wallpaper ..", R"("..")", "");
         add("wallpaper a directory", R"("images")", "");
         add("wallpaper linked out of the package", R"("out.jpg")", "");
-        add("version as text, volume not whole", R"("w.jpg", "version": "3", "ringerVolume": 60.5)", "1|80|-1|0|NULL|NULL|NULL|NULL|NULL|now");
         add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
             R"("timestamp": "2014-05-01T12:00:00.250Z", "displayName": "Edge", "highlightColor": "#112233", )"
             R"("secondaryHighlightColor": "#445566", "primaryColor": "#778899", "secondaryColors": "#80aabbcc")",
@@ -129,13 +123,11 @@ private slots:
             { "ringerToneFile|fallback-ringer.ogg" });
         add("disabled, empty file", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0})", "1|80|-2|1|NULL|NULL|NULL|NULL|NULL|now");
         add("empty tone object", R"("w.jpg", "ringerToneFile": {})", defaults);
-        add("slash in tone file", R"("w.jpg", "ringerToneFile": {"file": "sounds/dusk.ogg"})", defaults);
         add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
             R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
         add("unpaired surrogates", R"("w.jpg", "partnerSpace": "a\ud800b\udc00")", "1|80|-1|1|NULL|NULL|NULL|NULL|a\uFFFDb\uFFFD|now");
-        add("timestamp not ISO", R"("w.jpg", "timestamp": "yesterday")", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
-            R"("highlightColor": {"a": 1}, "ringerVolume": "60", "partnerSpace": 7, "timestamp": 12, "version": null, )"
+            R"("highlightColor": {"a": 1}, "ringerVolume": 60.5, "partnerSpace": 7, "timestamp": "yesterday", "version": "3", )"
             R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|NULL|NULL|NULL|now");
     }
 
@@ -165,7 +157,7 @@ private slots:
 
     void malformed_data()
     {
-        QTest::addColumn<QByteArray>("content");   // "<missing>", "<fifo>": a file that can't be opened
+        QTest::addColumn<QByteArray>("content");   // "<fifo>": a file that would block
         QTest::addColumn<int>("volume");           // of the bad file's row, 0 for none
         QTest::addColumn<QStringList>("warnings"); // patterns of the records, in order
         QTest::addColumn<QStringList>("files");    // fileName|ringerVolume|metadataCurrent afterwards
@@ -173,20 +165,13 @@ private slots:
                 + "/bad\\.themelet\" , jsonError: %1 , jsonOffset: %2$";
         const QStringList deleted { "bad.themelet|NULL|1", "good.themelet|42|1" };
         QTest::newRow("root array") << QByteArray(R"([{"wallpaper": "w.jpg"}])") << 41 << QStringList { parse.arg(0).arg(0) } << deleted;
-        QTest::newRow("not UTF-8") << QByteArray("{\"wallpaper\": \"w\xff.jpg\"}") << 41
-                                   << QStringList { parse.arg(QJsonParseError::IllegalUTF8String).arg("\\d+") } << deleted;
-        // Valid, but too large to be read: unreadable like a missing file, not malformed.
+        // Too large to read, not malformed; with a row, the merge's later entries go to the inserts and fail on the key.
         QTest::newRow("too large, with a row") << QByteArray(R"({"wallpaper": "w.jpg"})").append(4 << 20, ' ') << 41
                 << QStringList { "^Skipping a file of more than 4194304 bytes \"" + QRegularExpression::escape(package("bad")) + "/bad\\.themelet\"$" }
                         + failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
                                   "INSERT INTO themelet ( fileId,")
                 << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
         QTest::newRow("FIFO, which would block") << QByteArray("<fifo>") << 0 << QStringList() << deleted;
-        // Can't be opened but has a row: the merge sends later entries to the inserts, which fail on the key.
-        QTest::newRow("missing, with a row") << QByteArray("<missing>") << 41
-                << failure("virtual bool ThemeletManager::updateMetaData()", "Failed to execute m_insertThemelet.",
-                           "INSERT INTO themelet ( fileId,")
-                << QStringList { "bad.themelet|41|0", "good.themelet|42|0" };
     }
 
     // Bad input doesn't hold up the file after it in the batch.
@@ -198,10 +183,8 @@ private slots:
         QFETCH(QStringList, files);
         const qint64 bad = addThemelet("bad", content);
         const QString path = package("bad") + "/bad.themelet";
-        if (content.startsWith('<'))
-            QFile::remove(path);
         if (content == "<fifo>")
-            QCOMPARE(::mkfifo(QFile::encodeName(path).constData(), 0644), 0);
+            QVERIFY(QFile::remove(path) && ::mkfifo(QFile::encodeName(path).constData(), 0644) == 0);
         // The good file's row shows that the merge passes over a deleted one.
         const qint64 good = addThemelet("good", R"({"wallpaper": "w.jpg"})");
         m_db.exec(QStringLiteral("INSERT INTO themelet (fileId, ringerVolume) VALUES (%1, 42)").arg(good));
@@ -262,7 +245,6 @@ private slots:
             QTest::newRow(tag) << QString(before) << values << QString(row) << resources;
         };
         const char *read = "Plain|1|2014-05-01T12:00:00|1|NULL|NULL|80|-1|p|1";
-        add("empty map", "", {}, read);
         add("values", "", { { "displayName", "New" }, { "highlightColor", "#ff112233" }, { "secondaryColor", "#ff445566" },
                             { "secondaryColors", "#ffffffff" }, { "ringerVolume", 5 }, { "homeWallpaper", "/x.jpg" },
                             { "partnerSpace", "other" }, { "version", 9 }, { "favorite", QVariant() } },
@@ -304,12 +286,9 @@ private slots:
         QCOMPARE(SignalRecorder::calls(), QList<int>()); // the caller tells the clients
     }
 
-    // A setter emits nothing: the signal comes once the store reports the change, also one made by another process.
+    // A setter emits nothing: the signal comes from the store, also for another process's change. Keys untouched so far.
     void settings()
     {
-        for (const QString &each : { s_sourceKey, s_applicationKey, s_homeKey })
-            DConfTest::reset(each);
-        QVERIFY(DConfTest::barrier());
         ThemeletSettings settings;
         QSignalSpy source(&settings, &ThemeletSettings::sourceChanged), application(&settings, &ThemeletSettings::applicationImageChanged),
                 home(&settings, &ThemeletSettings::homeImageChanged);
@@ -382,12 +361,11 @@ private slots:
         QCOMPARE(m_manager->create(themelet), id);
         QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
         // A url that names no local file moves nothing.
-        for (const QUrl &url : { QUrl(), QUrl("http://example.com/moved.themelet") }) {
-            data->url = url;
-            QTest::ignoreMessage(QtWarningMsg, "qint64 ThemeletManager::create(const Themelet&)");
-            QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id).arg(url.toString())));
-            QCOMPARE(m_manager->create(themelet), 0);
-        }
+        data->url = QUrl("http://example.com/moved.themelet");
+        QTest::ignoreMessage(QtWarningMsg, "qint64 ThemeletManager::create(const Themelet&)");
+        QTest::ignoreMessage(QtWarningMsg, qPrintable(QString("No local directory for themelet %1 at QUrl(\"%2\")").arg(id)
+                                                      .arg(data->url.toString())));
+        QCOMPARE(m_manager->create(themelet), 0);
         QCOMPARE(m_db.rows(select), QStringList { row.arg("new|moved.themelet", "Moved").arg(12) });
         // Nothing to act on: no themelet, no file, an unknown id.
         QCOMPARE(m_manager->create(Themelet()) + m_manager->create(Themelet(new ThemeletData(0, QUrl::fromLocalFile(user("gone"))))), 0);
