@@ -183,18 +183,24 @@ private slots:
     void fileList_data()
     {
         QTest::addColumn<QString>("parameters"); // mime type; directories; categories
+        QTest::addColumn<QString>("tail");       // of the statement
         QTest::addColumn<QString>("names");
-        QTest::newRow("default") << ";;" << "a b c d e";
-        QTest::newRow("exact mime") << "audio/ogg;;" << "a d";
-        QTest::newRow("mime glob") << "audio/*;;" << "a b d e";
+        const QString byName = " ORDER BY  file.displayName ASC;";
+        QTest::newRow("default") << ";;" << byName << "a b c d e";
+        QTest::newRow("exact mime") << "audio/ogg;;" << "WHERE file.mimeType = ?" + byName << "a d";
+        QTest::newRow("mime glob") << "audio/*;;" << "WHERE file.mimeType GLOB ?" + byName << "a b d e";
         // "/d" takes in neither /d itself nor /dx.
-        QTest::newRow("two directories") << "audio/*;/d /e;" << "b e";
-        QTest::newRow("categories") << ";;Ringtone Customer Default" << "b d a c e";
+        QTest::newRow("two directories") << "audio/*;/d /e;"
+                << "WHERE file.mimeType GLOB ?\n     AND (directory.path GLOB ?\n         OR directory.path GLOB ?)" + byName << "b e";
+        QTest::newRow("categories") << ";;Ringtone Customer Default"
+                << " ORDER BY \n   CASE file.category\n     WHEN 'Ringtone' THEN 0\n     WHEN 'Customer' THEN 1"
+                   "\n     WHEN 'Default' THEN 2\n     ELSE 3\n   END, file.displayName ASC;" << "b d a c e";
     }
 
     void fileList()
     {
         QFETCH(QString, parameters);
+        QFETCH(QString, tail);
         QFETCH(QString, names);
         for (const QString file : { "/d/a.ogg audio/ogg Default", "/d/sub/b.mp3 audio/mpeg Ringtone", "/d/sub/deep/c.jpg image/jpeg",
                                     "/dx/d.ogg audio/ogg Customer", "/e/sub/e.ogg audio/x-vorbis+ogg Other" })
@@ -203,6 +209,10 @@ private slots:
         list.mimeType = parameters.section(';', 0, 0);
         list.directories = parameters.section(';', 1, 1).split(' ', Qt::SkipEmptyParts);
         list.categories = parameters.section(';', 2, 2).split(' ', Qt::SkipEmptyParts);
+        QVariantList bound;
+        QCOMPARE(FileQueryAgent::listStatement(list, &bound),
+                 "SELECT file.id, directory.path || '/' || file.fileName, file.mimeType, file.fileName, file.displayName, "
+                 "file.category, file.permissions FROM file INNER JOIN directory on file.directoryId = directory.id " + tail);
         Batches batches;
         QVERIFY(FileQueryAgent(*m_database).query(&batches, list));
         QCOMPARE(batches.names.join(' '), names);
