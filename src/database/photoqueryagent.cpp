@@ -25,7 +25,7 @@ Content photoFromRow(const QSqlQuery &query)
     photo->fileName = query.value(3).toString();
     photo->displayName = query.value(4).toString();
     photo->permissions = query.value(5).toInt();
-    photo->dateTaken = query.value(6).toDateTime();
+    photo->dateTakenValue = query.value(6);
     photo->width = query.value(7).toInt();
     photo->height = query.value(8).toInt();
     photo->orientation = query.value(9).toInt();

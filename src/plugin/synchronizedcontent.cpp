@@ -16,19 +16,38 @@ void SynchronizedContent::insertRange(int index, int count, const QVector<Conten
 
 void SynchronizedContent::removeRange(int index, int count)
 {
+    removeRange(index, count, nullptr);
+}
+
+void SynchronizedContent::removeRange(int index, int count, QVector<Content> *dropped)
+{
     if (count < 1)
         return;
     detach();
+    if (dropped) {
+        for (int i = 0; i < count; ++i)
+            dropped->append(std::move((*this)[index + i]));
+    }
     erase(begin() + index, begin() + index + count);
 }
 
 void SynchronizedContent::updateRange(int index, int count, const QVector<Content> &source, int sourceIndex)
 {
+    updateRange(index, count, source, sourceIndex, nullptr);
+}
+
+void SynchronizedContent::updateRange(int index, int count, const QVector<Content> &source, int sourceIndex,
+                                      QVector<Content> *dropped)
+{
     if (count < 1)
         return;
     detach();
-    for (int i = 0; i < count; ++i)
-        (*this)[index + i] = source.at(sourceIndex + i);
+    for (int i = 0; i < count; ++i) {
+        Content &row = (*this)[index + i];
+        if (dropped)
+            dropped->append(std::move(row));
+        row = source.at(sourceIndex + i);
+    }
 }
 
 void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationInterface *agent)

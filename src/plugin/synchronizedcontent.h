@@ -33,6 +33,9 @@ public:
     void insertRange(int index, int count, const QVector<Content> &source, int sourceIndex) override;
     void removeRange(int index, int count) override;
     void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex) override;
+    // The same two edits, moving the handles they drop to the end of `dropped`.
+    void removeRange(int index, int count, QVector<Content> *dropped);
+    void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex, QVector<Content> *dropped);
 
     // One step of the incremental merge: brings this list into line with as much
     // of `source` as can be decided, editing it through `agent`, which changes this
