@@ -12,6 +12,7 @@
 #include <QThreadPool>
 
 #include <algorithm>
+#include <cstring>
 
 QMutex AbstractContentModel::s_queryMutex;
 
@@ -184,6 +185,26 @@ bool AbstractContentModel::event(QEvent *event)
     }
 }
 
+namespace {
+
+// Moves every handle of `from` to the end of `to`, leaving `from` empty with its
+// capacity. The handles are relocatable (QVector itself treats them so): copied
+// as bytes, then nulled where they were; no record's count is touched.
+void appendTaken(QVector<Content> &to, QVector<Content> &from)
+{
+    static_assert(sizeof(Content) == sizeof(ContentData *), "a handle is its record pointer");
+    const int size = to.size();
+    const int taken = from.size();
+    if (taken == 0)
+        return;
+    to.resize(size + taken);
+    std::memcpy(static_cast<void *>(to.data() + size), from.constData(), size_t(taken) * sizeof(Content));
+    std::memset(static_cast<void *>(from.data()), 0, size_t(taken) * sizeof(Content));
+    from.clear(); // keeps the capacity
+}
+
+}
+
 void AbstractContentModel::takePendingContent()
 {
     {
@@ -196,10 +217,7 @@ void AbstractContentModel::takePendingContent()
     // A query usually brings about as many rows as are on show: room for them at once.
     if (m_receivedContent.isEmpty())
         m_receivedContent.reserve(std::max(m_content.size() + QueryAgent::BatchSize, m_spareContent.size()));
-    // Moved, not copied: no count of a record is touched here.
-    for (Content &row : m_spareContent)
-        m_receivedContent.append(std::move(row));
-    m_spareContent.clear(); // keeps its capacity
+    appendTaken(m_receivedContent, m_spareContent);
     m_contentReceived = true;
     postUpdate();
 }
@@ -213,10 +231,17 @@ void AbstractContentModel::update()
 
         if (m_contentReceived) {
             m_contentReceived = false;
-            // Not emptied: it grows over the query, and m_content's cursors say how far it was merged.
-            const QVector<Content> received = m_receivedContent;
+            // Not emptied: it grows over the query, and m_content's cursors say how far it
+            // was merged. Out of its member while merged: a handler that runs the event
+            // loop may take more rows in, which then follow.
+            QVector<Content> received;
+            received.swap(m_receivedContent);
             beginEdit();
+            m_ownedSource = &received;
             m_content.merge(received, agent);
+            m_ownedSource = nullptr;
+            appendTaken(received, m_receivedContent);
+            m_receivedContent.swap(received);
             endEdit();
             if (filtered)
                 refilter();
@@ -245,13 +270,15 @@ void AbstractContentModel::update()
 
         beginEdit();
         if (m_pendingStatus != Null) {
+            m_ownedSource = &received;
             m_content.finish(received, agent);
+            m_ownedSource = nullptr;
         } else {
             if (!m_content.isEmpty())
                 agent->removeRange(0, m_content.size());
             m_content.resetCursors();
         }
-        // The rows now hold their own handles on the received records.
+        // What is left of the received rows: nulls, or records a filter keeps out.
         if (m_releasedSource.isEmpty())
             m_releasedSource.swap(received);
         else
@@ -436,7 +463,10 @@ void AbstractContentModel::insertRange(int index, int count, const QVector<Conte
     if (count < 1)
         return;
     beginInsertRows(QModelIndex(), index, index + count - 1);
-    m_currentContent->insertRange(index, count, source, sourceIndex);
+    if (&source == m_ownedSource)
+        m_currentContent->takeInsert(index, count, *m_ownedSource, sourceIndex);
+    else
+        m_currentContent->insertRange(index, count, source, sourceIndex);
     endInsertRows();
     emit countChanged();
 }
@@ -456,7 +486,12 @@ void AbstractContentModel::updateRange(int index, int count, const QVector<Conte
     // Dead during filter passes: rows that stay under a filter keep the record they had.
     if (m_synchronizing || count < 1)
         return;
-    m_currentContent->updateRange(index, count, source, sourceIndex, &m_released);
+    if (&source == m_ownedSource) {
+        m_currentContent->takeUpdate(index, count, *m_ownedSource, sourceIndex, &m_released);
+    } else {
+        m_released += m_currentContent->mid(index, count);
+        m_currentContent->updateRange(index, count, source, sourceIndex);
+    }
     emit dataChanged(this->index(index), this->index(index + count - 1));
 }
 

@@ -103,6 +103,9 @@ private:
     // the GUI thread never frees a buffer the query thread made, which in
     // glibc means sorting out that thread's whole heap arena.
     QVector<Content> m_spareContent;
+    // The received rows while they are merged into the view: the rows taken
+    // from it need no copy.
+    QVector<Content> *m_ownedSource = nullptr;
     // Records the view no longer holds, and the rows of ended queries, to be
     // let go off the GUI thread.
     QVector<Content> m_released;
