@@ -92,7 +92,13 @@ public:
         m_clock.start();
         m_timer.start(1);
     }
-    void setPhase(const QString &phase) { m_phase = phase; }
+    // A new phase; with `fresh`, the gap up to now is not counted.
+    void setPhase(const QString &phase, bool fresh = false)
+    {
+        m_phase = phase;
+        if (fresh)
+            m_last = m_clock.nsecsElapsed();
+    }
     double longestMs() const { return double(m_longest) / 1e6; }
     QString longestPhase() const { return m_longestPhase; }
 
@@ -170,8 +176,9 @@ int main(int argc, char **argv)
     Bench::result(QStringLiteral("P4"), values);
 
     // P7: the load above, then a re-query that finds one photo more.
-    heartbeat.setPhase(QStringLiteral("requery"));
+    // The write is the service's, in its own process: its time on this thread is no stall of the model's.
     const bool added = addPhoto(index);
+    heartbeat.setPhase(QStringLiteral("requery"), true);
     QMetaObject::invokeMethod(&model, "contentChanged", Qt::DirectConnection, Q_ARG(int, ThemeletContent::Photo));
     QElapsedTimer requery;
     requery.start();

@@ -42,17 +42,3 @@ ThemeletContent::Type Content::type() const
 {
     return m_data ? ThemeletContent::Type(m_data->type) : ThemeletContent::Type(-1);
 }
-
-bool operator==(const Content &a, const Content &b)
-{
-    const ContentData *x = a.data();
-    const ContentData *y = b.data();
-    if (!x || !y)
-        return !x && !y;
-    return x->type == y->type && x->id == y->id;
-}
-
-bool operator!=(const Content &a, const Content &b)
-{
-    return !(a == b);
-}

@@ -14,6 +14,8 @@
 #include <QSharedDataPointer>
 #include <QVector>
 
+#include <utility>
+
 // One-pointer, reference-counted handle on a content record. Batches travel
 // between threads as QVector<Content>, so the count is atomic.
 class Content
@@ -22,9 +24,16 @@ public:
     Content() = default;
     Content(ContentData *data);
     Content(const Content &other);
+    // A move leaves `other` null and touches no count: cheap on a hot path.
+    Content(Content &&other) noexcept : m_data(other.m_data) { other.m_data = nullptr; }
     ~Content();
 
     Content &operator=(const Content &other);
+    Content &operator=(Content &&other) noexcept
+    {
+        std::swap(m_data, other.m_data);
+        return *this;
+    }
 
     ThemeletContent::Type type() const;
     bool isValid() const { return m_data != nullptr; }
@@ -38,8 +47,20 @@ private:
     ContentData *m_data = nullptr;
 };
 
-bool operator==(const Content &a, const Content &b);
-bool operator!=(const Content &a, const Content &b);
+// Same item: same type and id. Inline, as a merge compares every row.
+inline bool operator==(const Content &a, const Content &b)
+{
+    const ContentData *x = a.data();
+    const ContentData *y = b.data();
+    if (x == y)
+        return true;
+    return x && y && x->type == y->type && x->id == y->id;
+}
+
+inline bool operator!=(const Content &a, const Content &b)
+{
+    return !(a == b);
+}
 
 Q_DECLARE_TYPEINFO(Content, Q_MOVABLE_TYPE);
 Q_DECLARE_METATYPE(Content)

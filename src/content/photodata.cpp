@@ -18,7 +18,7 @@ ContentData *PhotoData::clone() const
 QVariant PhotoData::data(int role) const
 {
     switch (role) {
-    case DateTakenRole: return dateTaken;
+    case DateTakenRole: return dateTaken();
     case WidthRole: return width;
     case HeightRole: return height;
     case OrientationRole: return orientation;

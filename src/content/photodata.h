@@ -25,7 +25,11 @@ public:
 
     static QHash<int, QByteArray> roleNames();
 
-    QDateTime dateTaken;
+    // Read as the index holds it; made a QDateTime (a local-time lookup) only
+    // when asked, which a list of thousands mostly never is.
+    QDateTime dateTaken() const { return dateTakenValue.toDateTime(); }
+
+    QVariant dateTakenValue;
     int width = 0;
     int height = 0;
     int orientation = 0;

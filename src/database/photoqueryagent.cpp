@@ -3,6 +3,8 @@
 
 #include "photoqueryagent.h"
 
+#include "statementreader.h"
+
 namespace {
 
 const QString s_select = QStringLiteral(
@@ -17,18 +19,17 @@ const QString s_byPath = s_select + QLatin1String("LEFT JOIN photo ON file.id = 
 const QString s_bySource = s_select + QLatin1String("LEFT JOIN photo ON file.id = photo.fileId WHERE file.id IN (SELECT fileId FROM download WHERE source = ?);");
 const QString s_list = s_select + QLatin1String("INNER JOIN image on file.id = image.fileId ORDER BY image.dateTaken;");
 
-Content photoFromRow(const QSqlQuery &query)
+Content photoFromRow(const StatementReader &row)
 {
-    PhotoData *photo = new PhotoData(QueryAgent::idFromColumn(query, 0),
-                                     QUrl::fromLocalFile(query.value(1).toString()));
-    photo->mimeType = query.value(2).toString();
-    photo->fileName = query.value(3).toString();
-    photo->displayName = query.value(4).toString();
-    photo->permissions = query.value(5).toInt();
-    photo->dateTaken = query.value(6).toDateTime();
-    photo->width = query.value(7).toInt();
-    photo->height = query.value(8).toInt();
-    photo->orientation = query.value(9).toInt();
+    PhotoData *photo = new PhotoData(row.id(0), QUrl::fromLocalFile(row.text(1)));
+    photo->mimeType = row.text(2);
+    photo->fileName = row.text(3);
+    photo->displayName = row.text(4);
+    photo->permissions = row.integer(5);
+    photo->dateTakenValue = row.value(6);
+    photo->width = row.integer(7);
+    photo->height = row.integer(8);
+    photo->orientation = row.integer(9);
     return Content(photo);
 }
 
@@ -58,9 +59,10 @@ Content PhotoQueryAgent::querySinglePhoto(QSqlQuery &query)
         warn(query, "Content PhotoQueryAgent::querySinglePhoto(QSqlQuery&)", "Failed to query photo");
         return Content();
     }
-    if (!query.next())
+    StatementReader row(query);
+    if (!row.next())
         return Content();
-    Content content = photoFromRow(query);
+    Content content = photoFromRow(row);
     query.finish();
     return content;
 }
@@ -73,6 +75,7 @@ bool PhotoQueryAgent::query(QueryAgent::Recipient *recipient, const QueryAgent::
              "Failed to execute photo query");
         return false;
     }
-    deliver(query, recipient, photoFromRow);
+    StatementReader rows(query, true);
+    deliver(rows, recipient, photoFromRow);
     return true;
 }

@@ -11,17 +11,27 @@
 #include <QQmlEngine>
 #include <QThreadPool>
 
+#include <algorithm>
+#include <cstring>
+
 QMutex AbstractContentModel::s_queryMutex;
 
 namespace {
 
+// Rows are waiting in m_pendingContent.
 class ContentEvent : public QEvent
 {
 public:
     static const QEvent::Type s_type = QEvent::User;
-    explicit ContentEvent(const QVector<Content> &content) : QEvent(s_type), content(content) {}
-    const QVector<Content> content;
+    ContentEvent() : QEvent(s_type) {}
 };
+
+// The most rows the GUI thread is handed at once while a query runs: a
+// merge of this many is well within a frame.
+const int s_gatherLimit = 4096;
+
+// Records freed together once a query has ended, or once this many have gathered.
+const int s_releaseBatch = 10000;
 
 class QueryCompleteEvent : public QEvent
 {
@@ -62,14 +72,27 @@ public:
 
     void contentQueried(const QVector<Content> &content) override
     {
-        // Posted under the lock, so that the model can't go between the test and the post.
+        // Under the lock, so that the model can't go between the test and the post.
+        // One event stands for every batch that comes before the model takes them,
+        // and after the first batch the rows gather to a quarter of those sent so
+        // far (at most s_gatherLimit): a wake of the GUI thread costs more than
+        // the rows of a batch. The rest goes with the end of the query.
         QMutexLocker locker(&s_queryMutex);
-        if (m_model)
-            QCoreApplication::postEvent(m_model, new ContentEvent(content));
+        if (!m_model || content.isEmpty())
+            return;
+        m_delivered += content.size();
+        for (const Content &row : content)
+            m_model->m_pendingContent.append(row);
+        const int gather = std::min(std::max<int>(QueryAgent::BatchSize, m_delivered / 4), s_gatherLimit);
+        if (!m_model->m_contentPosted && m_model->m_pendingContent.size() >= gather) {
+            m_model->m_contentPosted = true;
+            QCoreApplication::postEvent(m_model, new ContentEvent);
+        }
     }
 
     QueryAgent::Parameters *m_parameters;
     AbstractContentModel *m_model;
+    int m_delivered = 0;
     const int m_contentType;
 };
 
@@ -145,16 +168,12 @@ void AbstractContentModel::postUpdate()
 bool AbstractContentModel::event(QEvent *event)
 {
     switch (int(event->type())) {
-    case ContentEvent::s_type: {
-        const QVector<Content> &content = static_cast<ContentEvent *>(event)->content;
-        if (!content.isEmpty()) {
-            m_receivedContent += content;
-            m_contentReceived = true;
-            postUpdate();
-        }
+    case ContentEvent::s_type:
+        takePendingContent();
         return true;
-    }
     case QueryCompleteEvent::s_type:
+        // Posted after the last batch, whose ContentEvent came first; taken here all the same.
+        takePendingContent();
         m_pendingStatus = static_cast<QueryCompleteEvent *>(event)->ok ? Finished : Error;
         postUpdate();
         return true;
@@ -166,6 +185,43 @@ bool AbstractContentModel::event(QEvent *event)
     }
 }
 
+namespace {
+
+// Moves every handle of `from` to the end of `to`, leaving `from` empty with its
+// capacity. The handles are relocatable (QVector itself treats them so): copied
+// as bytes, then nulled where they were; no record's count is touched.
+void appendTaken(QVector<Content> &to, QVector<Content> &from)
+{
+    static_assert(sizeof(Content) == sizeof(ContentData *), "a handle is its record pointer");
+    const int size = to.size();
+    const int taken = from.size();
+    if (taken == 0)
+        return;
+    to.resize(size + taken);
+    std::memcpy(static_cast<void *>(to.data() + size), from.constData(), size_t(taken) * sizeof(Content));
+    std::memset(static_cast<void *>(from.data()), 0, size_t(taken) * sizeof(Content));
+    from.clear(); // keeps the capacity
+}
+
+}
+
+void AbstractContentModel::takePendingContent()
+{
+    {
+        QMutexLocker locker(&s_queryMutex);
+        m_spareContent.swap(m_pendingContent);
+        m_contentPosted = false;
+    }
+    if (m_spareContent.isEmpty())
+        return;
+    // A query usually brings about as many rows as are on show: room for them at once.
+    if (m_receivedContent.isEmpty())
+        m_receivedContent.reserve(std::max(m_content.size() + QueryAgent::BatchSize, m_spareContent.size()));
+    appendTaken(m_receivedContent, m_spareContent);
+    m_contentReceived = true;
+    postUpdate();
+}
+
 void AbstractContentModel::update()
 {
     for (;;) {
@@ -175,10 +231,17 @@ void AbstractContentModel::update()
 
         if (m_contentReceived) {
             m_contentReceived = false;
-            // Not emptied: it grows over the query, and m_content's cursors say how far it was merged.
-            const QVector<Content> received = m_receivedContent;
+            // Not emptied: it grows over the query, and m_content's cursors say how far it
+            // was merged. Out of its member while merged: a handler that runs the event
+            // loop may take more rows in, which then follow.
+            QVector<Content> received;
+            received.swap(m_receivedContent);
             beginEdit();
+            m_ownedSource = &received;
             m_content.merge(received, agent);
+            m_ownedSource = nullptr;
+            appendTaken(received, m_receivedContent);
+            m_receivedContent.swap(received);
             endEdit();
             if (filtered)
                 refilter();
@@ -207,12 +270,19 @@ void AbstractContentModel::update()
 
         beginEdit();
         if (m_pendingStatus != Null) {
+            m_ownedSource = &received;
             m_content.finish(received, agent);
+            m_ownedSource = nullptr;
         } else {
             if (!m_content.isEmpty())
                 agent->removeRange(0, m_content.size());
             m_content.resetCursors();
         }
+        // What is left of the received rows: nulls, or records a filter keeps out.
+        if (m_releasedSource.isEmpty())
+            m_releasedSource.swap(received);
+        else
+            m_releasedSource += received;
         endEdit();
         if (filtered)
             refilter();
@@ -393,7 +463,10 @@ void AbstractContentModel::insertRange(int index, int count, const QVector<Conte
     if (count < 1)
         return;
     beginInsertRows(QModelIndex(), index, index + count - 1);
-    m_currentContent->insertRange(index, count, source, sourceIndex);
+    if (&source == m_ownedSource)
+        m_currentContent->takeInsert(index, count, *m_ownedSource, sourceIndex);
+    else
+        m_currentContent->insertRange(index, count, source, sourceIndex);
     endInsertRows();
     emit countChanged();
 }
@@ -403,8 +476,7 @@ void AbstractContentModel::removeRange(int index, int count)
     if (count < 1)
         return;
     beginRemoveRows(QModelIndex(), index, index + count - 1);
-    m_released += m_currentContent->mid(index, count);
-    m_currentContent->removeRange(index, count);
+    m_currentContent->removeRange(index, count, &m_released);
     endRemoveRows();
     emit countChanged();
 }
@@ -414,21 +486,30 @@ void AbstractContentModel::updateRange(int index, int count, const QVector<Conte
     // Dead during filter passes: rows that stay under a filter keep the record they had.
     if (m_synchronizing || count < 1)
         return;
-    m_released += m_currentContent->mid(index, count);
-    m_currentContent->updateRange(index, count, source, sourceIndex);
+    if (&source == m_ownedSource) {
+        m_currentContent->takeUpdate(index, count, *m_ownedSource, sourceIndex, &m_released);
+    } else {
+        m_released += m_currentContent->mid(index, count);
+        m_currentContent->updateRange(index, count, source, sourceIndex);
+    }
     emit dataChanged(this->index(index), this->index(index + count - 1));
 }
 
 // Replaced and removed records are freed on a pool thread: on a re-query of
 // 100,000 rows, freeing them was most of the GUI thread's work. The handles'
-// counts are atomic, and nothing else holds these records any more.
+// counts are atomic, and nothing else holds these records any more. They go
+// in a few large lots: starting a pool thread per batch of 50 cost a third
+// of a merge.
 void AbstractContentModel::releaseRecords()
 {
-    if (m_released.isEmpty())
+    if (m_released.size() + m_releasedSource.size() == 0)
         return;
-    auto *released = new QVector<Content>;
-    released->swap(m_released);
-    QThreadPool::globalInstance()->start([released]() { delete released; });
+    if (m_status == Querying && m_released.size() < s_releaseBatch && m_releasedSource.isEmpty())
+        return;
+    auto *released = new QVector<Content>[2];
+    released[0].swap(m_released);
+    released[1].swap(m_releasedSource);
+    QThreadPool::globalInstance()->start([released]() { delete[] released; });
 }
 
 void AbstractContentModel::beginEdit()

@@ -87,6 +87,7 @@ private:
     // The row on show, private to this list and its record to this row.
     Content &detachedRow(int index);
     void saveAttributes(const Content &row, const QVariantMap &attributes);
+    void takePendingContent();
     void beginEdit();
     void releaseRecords();
     void endEdit();
@@ -94,8 +95,21 @@ private:
     SynchronizedContent m_content;
     SynchronizedContent m_filteredContent;
     QVector<Content> m_receivedContent;
-    // Records the view no longer holds, to be freed off the GUI thread.
+    // Rows the query thread has handed over since the last ContentEvent was
+    // taken, and whether that event is on its way; both under s_queryMutex.
+    QVector<Content> m_pendingContent;
+    bool m_contentPosted = false;
+    // The buffer m_pendingContent is swapped with, kept empty with its capacity:
+    // the GUI thread never frees a buffer the query thread made, which in
+    // glibc means sorting out that thread's whole heap arena.
+    QVector<Content> m_spareContent;
+    // The received rows while they are merged into the view: the rows taken
+    // from it need no copy.
+    QVector<Content> *m_ownedSource = nullptr;
+    // Records the view no longer holds, and the rows of ended queries, to be
+    // let go off the GUI thread.
     QVector<Content> m_released;
+    QVector<Content> m_releasedSource;
     SynchronizedContent *m_currentContent;
     QueryAgent::Parameters *m_queuedQuery = nullptr;
     QueryRunner *m_queryRunner = nullptr;

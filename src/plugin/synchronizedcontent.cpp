@@ -5,20 +5,50 @@
 
 SynchronizationInterface::~SynchronizationInterface() = default;
 
+namespace {
+
+// How many rows ahead a walk loads the records it will compare.
+const int s_prefetch = 32;
+
+}
+
 void SynchronizedContent::insertRange(int index, int count, const QVector<Content> &source, int sourceIndex)
 {
     if (count < 1)
         return;
-    detach();
+    insert(begin() + index, count, Content()); // detaches, moves the tail once
+    Content *rows = data() + index;
+    const Content *from = source.constData() + sourceIndex;
     for (int i = 0; i < count; ++i)
-        insert(index + i, source.at(sourceIndex + i));
+        rows[i] = from[i];
+}
+
+void SynchronizedContent::takeInsert(int index, int count, QVector<Content> &source, int sourceIndex)
+{
+    if (count < 1)
+        return;
+    insert(begin() + index, count, Content());
+    Content *rows = data() + index;
+    Content *from = source.data() + sourceIndex;
+    for (int i = 0; i < count; ++i)
+        rows[i] = std::move(from[i]);
 }
 
 void SynchronizedContent::removeRange(int index, int count)
 {
+    removeRange(index, count, nullptr);
+}
+
+void SynchronizedContent::removeRange(int index, int count, QVector<Content> *dropped)
+{
     if (count < 1)
         return;
     detach();
+    if (dropped) {
+        Content *rows = data() + index;
+        for (int i = 0; i < count; ++i)
+            dropped->append(std::move(rows[i]));
+    }
     erase(begin() + index, begin() + index + count);
 }
 
@@ -26,9 +56,23 @@ void SynchronizedContent::updateRange(int index, int count, const QVector<Conten
 {
     if (count < 1)
         return;
-    detach();
+    Content *rows = data() + index; // detaches once
+    const Content *from = source.constData() + sourceIndex;
     for (int i = 0; i < count; ++i)
-        (*this)[index + i] = source.at(sourceIndex + i);
+        rows[i] = from[i];
+}
+
+void SynchronizedContent::takeUpdate(int index, int count, QVector<Content> &source, int sourceIndex,
+                                     QVector<Content> *dropped)
+{
+    if (count < 1)
+        return;
+    Content *rows = data() + index;
+    Content *from = source.data() + sourceIndex;
+    for (int i = 0; i < count; ++i) {
+        dropped->append(std::move(rows[i]));
+        rows[i] = std::move(from[i]);
+    }
 }
 
 void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationInterface *agent)
@@ -59,6 +103,11 @@ bool SynchronizedContent::walk(const QVector<Content> &list, const QVector<Conte
     };
 
     while (index < list.size() && sourceIndex < source.size()) {
+        // The records lie all over the heap: ask for the ones a few rows on while comparing these.
+        if (index + s_prefetch < list.size() && sourceIndex + s_prefetch < source.size()) {
+            __builtin_prefetch(list.at(index + s_prefetch).data());
+            __builtin_prefetch(source.at(sourceIndex + s_prefetch).data(), 1); // its count is taken next
+        }
         if (list.at(index) == source.at(sourceIndex)) {
             ++index;
             ++sourceIndex;

@@ -33,6 +33,12 @@ public:
     void insertRange(int index, int count, const QVector<Content> &source, int sourceIndex) override;
     void removeRange(int index, int count) override;
     void updateRange(int index, int count, const QVector<Content> &source, int sourceIndex) override;
+    // The same edits for the owner of `source`: the rows are taken out of it
+    // (left null there) instead of copied, and the handles the list drops are
+    // moved to the end of `dropped`. No record's count is touched.
+    void takeInsert(int index, int count, QVector<Content> &source, int sourceIndex);
+    void takeUpdate(int index, int count, QVector<Content> &source, int sourceIndex, QVector<Content> *dropped);
+    void removeRange(int index, int count, QVector<Content> *dropped);
 
     // One step of the incremental merge: brings this list into line with as much
     // of `source` as can be decided, editing it through `agent`, which changes this

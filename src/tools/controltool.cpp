@@ -273,7 +273,7 @@ int ControlTool::list(const QStringList &arguments)
         table.append({ QStringLiteral("ID"), QStringLiteral("TAKEN"), QStringLiteral("SIZE"), QStringLiteral("PATH") });
         for (const Content &row : qAsConst(rows)) {
             const auto *data = static_cast<const PhotoData *>(row.data());
-            const QString taken = ContentPrinter::toText(data->dateTaken);
+            const QString taken = ContentPrinter::toText(data->dateTaken());
             table.append({ QString::number(data->id), taken.isEmpty() ? QStringLiteral("-") : taken,
                            sizeOf(data), data->url.toLocalFile() });
         }
