@@ -81,8 +81,10 @@ public:
         if (!m_model || content.isEmpty())
             return;
         m_delivered += content.size();
-        for (const Content &row : content)
+        for (const Content &row : content) {
             m_model->m_pendingContent.append(row);
+            m_model->m_pendingKeys.append(SynchronizedContent::key(row)); // while the record is at hand
+        }
         const int gather = std::min(std::max<int>(QueryAgent::BatchSize, m_delivered / 4), s_gatherLimit);
         if (!m_model->m_contentPosted && m_model->m_pendingContent.size() >= gather) {
             m_model->m_contentPosted = true;
@@ -210,14 +212,20 @@ void AbstractContentModel::takePendingContent()
     {
         QMutexLocker locker(&s_queryMutex);
         m_spareContent.swap(m_pendingContent);
+        m_spareKeys.swap(m_pendingKeys);
         m_contentPosted = false;
     }
     if (m_spareContent.isEmpty())
         return;
     // A query usually brings about as many rows as are on show: room for them at once.
-    if (m_receivedContent.isEmpty())
-        m_receivedContent.reserve(std::max(m_content.size() + QueryAgent::BatchSize, m_spareContent.size()));
+    if (m_receivedContent.isEmpty()) {
+        const int rows = std::max(m_content.size() + QueryAgent::BatchSize, m_spareContent.size());
+        m_receivedContent.reserve(rows);
+        m_receivedKeys.reserve(rows);
+    }
     appendTaken(m_receivedContent, m_spareContent);
+    m_receivedKeys += m_spareKeys;
+    m_spareKeys.clear(); // keeps the capacity
     m_contentReceived = true;
     postUpdate();
 }
@@ -236,12 +244,16 @@ void AbstractContentModel::update()
             // loop may take more rows in, which then follow.
             QVector<Content> received;
             received.swap(m_receivedContent);
+            QVector<SynchronizedContent::Key> keys;
+            keys.swap(m_receivedKeys);
             beginEdit();
             m_ownedSource = &received;
-            m_content.merge(received, agent);
+            m_content.merge(received, agent, keys);
             m_ownedSource = nullptr;
             appendTaken(received, m_receivedContent);
             m_receivedContent.swap(received);
+            keys += m_receivedKeys;
+            m_receivedKeys.swap(keys);
             endEdit();
             if (filtered)
                 refilter();
@@ -260,6 +272,8 @@ void AbstractContentModel::update()
 
         QVector<Content> received;
         received.swap(m_receivedContent);
+        QVector<SynchronizedContent::Key> keys;
+        keys.swap(m_receivedKeys);
 
         m_status = m_pendingStatus;
         if (m_queuedQuery) {
@@ -271,7 +285,7 @@ void AbstractContentModel::update()
         beginEdit();
         if (m_pendingStatus != Null) {
             m_ownedSource = &received;
-            m_content.finish(received, agent);
+            m_content.finish(received, agent, &keys);
             m_ownedSource = nullptr;
         } else {
             if (!m_content.isEmpty())

@@ -98,11 +98,15 @@ private:
     // Rows the query thread has handed over since the last ContentEvent was
     // taken, and whether that event is on its way; both under s_queryMutex.
     QVector<Content> m_pendingContent;
+    QVector<SynchronizedContent::Key> m_pendingKeys;
     bool m_contentPosted = false;
     // The buffer m_pendingContent is swapped with, kept empty with its capacity:
     // the GUI thread never frees a buffer the query thread made, which in
     // glibc means sorting out that thread's whole heap arena.
     QVector<Content> m_spareContent;
+    QVector<SynchronizedContent::Key> m_spareKeys;
+    // The keys of m_receivedContent, row for row.
+    QVector<SynchronizedContent::Key> m_receivedKeys;
     // The received rows while they are merged into the view: the rows taken
     // from it need no copy.
     QVector<Content> *m_ownedSource = nullptr;

@@ -5,11 +5,12 @@
 
 SynchronizationInterface::~SynchronizationInterface() = default;
 
-namespace {
-
-// How many rows ahead a walk loads the records it will compare.
-const int s_prefetch = 32;
-
+SynchronizedContent::Key SynchronizedContent::key(const Content &row)
+{
+    const ContentData *data = row.data();
+    if (!data || data->type < 0 || data->type >= 0xff || data->id < 0 || data->id >= (qint64(1) << 56))
+        return NoKey;
+    return (Key(data->type) << 56) | Key(data->id);
 }
 
 void SynchronizedContent::insertRange(int index, int count, const QVector<Content> &source, int sourceIndex)
@@ -75,7 +76,8 @@ void SynchronizedContent::takeUpdate(int index, int count, QVector<Content> &sou
     }
 }
 
-void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationInterface *agent)
+void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationInterface *agent,
+                                const QVector<Key> &sourceKeys)
 {
     if (m_index == size()) {
         // Nothing old left to compare with: the rest arrives as one insertion.
@@ -84,16 +86,42 @@ void SynchronizedContent::merge(const QVector<Content> &source, SynchronizationI
         m_sourceIndex = source.size();
         return;
     }
-    walk(*this, source, m_index, m_sourceIndex, agent);
+    if (sourceKeys.size() != source.size() || m_keys.isEmpty()) {
+        walk(*this, source, m_index, m_sourceIndex, agent);
+        return;
+    }
+    const QVector<Key> &keys = m_keys;
+    walk(*this, source, m_index, m_sourceIndex, agent, true, [&](int index, int sourceIndex) {
+        const int k = index - (size() - keys.size());
+        if (k >= 0 && k < keys.size()) {
+            const Key a = keys.at(k);
+            const Key b = sourceKeys.at(sourceIndex);
+            if (a != NoKey && b != NoKey)
+                return a == b;
+        }
+        return at(index) == source.at(sourceIndex);
+    });
 }
 
-void SynchronizedContent::finish(const QVector<Content> &source, SynchronizationInterface *agent)
+void SynchronizedContent::finish(const QVector<Content> &source, SynchronizationInterface *agent,
+                                 QVector<Key> *sourceKeys)
 {
     finish(*this, source, m_index, m_sourceIndex, agent);
+    m_keys.clear();
+    if (sourceKeys && sourceKeys->size() == source.size() && size() == source.size())
+        m_keys.swap(*sourceKeys);
 }
 
 bool SynchronizedContent::walk(const QVector<Content> &list, const QVector<Content> &source, int &index,
                                int &sourceIndex, SynchronizationInterface *agent, bool refresh)
+{
+    return walk(list, source, index, sourceIndex, agent, refresh,
+                [&](int i, int j) { return list.at(i) == source.at(j); });
+}
+
+template <typename Same>
+bool SynchronizedContent::walk(const QVector<Content> &list, const QVector<Content> &source, int &index,
+                               int &sourceIndex, SynchronizationInterface *agent, bool refresh, Same same)
 {
     int run = index;
     int runSource = sourceIndex;
@@ -103,12 +131,7 @@ bool SynchronizedContent::walk(const QVector<Content> &list, const QVector<Conte
     };
 
     while (index < list.size() && sourceIndex < source.size()) {
-        // The records lie all over the heap: ask for the ones a few rows on while comparing these.
-        if (index + s_prefetch < list.size() && sourceIndex + s_prefetch < source.size()) {
-            __builtin_prefetch(list.at(index + s_prefetch).data());
-            __builtin_prefetch(source.at(sourceIndex + s_prefetch).data(), 1); // its count is taken next
-        }
-        if (list.at(index) == source.at(sourceIndex)) {
+        if (same(index, sourceIndex)) {
             ++index;
             ++sourceIndex;
             continue;

@@ -40,13 +40,29 @@ public:
     void takeUpdate(int index, int count, QVector<Content> &source, int sourceIndex, QVector<Content> *dropped);
     void removeRange(int index, int count, QVector<Content> *dropped);
 
+    // A row's identity in one word, so that a merge can compare rows without
+    // reaching for their records, which lie all over the heap: the type in the
+    // top byte, the id below. A null row, or one whose type or id doesn't fit,
+    // gets NoKey and is compared through its record.
+    typedef quint64 Key;
+    static const Key NoKey = ~Key(0);
+    static Key key(const Content &row);
+
     // One step of the incremental merge: brings this list into line with as much
     // of `source` as can be decided, editing it through `agent`, which changes this
     // list. Rows in front of the cursors stay until a later batch or finish().
-    void merge(const QVector<Content> &source, SynchronizationInterface *agent);
-    // The end of a query: undecided rows go, unconsumed ones come, cursors return to 0.
-    void finish(const QVector<Content> &source, SynchronizationInterface *agent);
-    void resetCursors() { m_index = m_sourceIndex = 0; }
+    // `sourceKeys`, if it has one key a source row, spares reading the records.
+    void merge(const QVector<Content> &source, SynchronizationInterface *agent,
+               const QVector<Key> &sourceKeys = QVector<Key>());
+    // The end of a query: undecided rows go, unconsumed ones come, cursors return
+    // to 0. The list is then the source, row for row, and takes its keys.
+    void finish(const QVector<Content> &source, SynchronizationInterface *agent,
+                QVector<Key> *sourceKeys = nullptr);
+    void resetCursors()
+    {
+        m_index = m_sourceIndex = 0;
+        m_keys.clear();
+    }
 
     int index() const { return m_index; }
     int sourceIndex() const { return m_sourceIndex; }
@@ -61,11 +77,18 @@ public:
                        SynchronizationInterface *agent);
 
 private:
+    template <typename Same>
+    static bool walk(const QVector<Content> &list, const QVector<Content> &source, int &index, int &sourceIndex,
+                     SynchronizationInterface *agent, bool refresh, Same same);
     static bool findAnchor(const QVector<Content> &list, const QVector<Content> &source, int index, int sourceIndex,
                            SynchronizationInterface *agent, int *matchedIndex, int *matchedSourceIndex);
 
     int m_index = 0;
     int m_sourceIndex = 0;
+    // The keys of the rows as the last finish() left them. The edits of a merge
+    // all fall at its cursor, so the rows from the cursor on are those rows
+    // still, moved by as many places as the list has grown since.
+    QVector<Key> m_keys;
 };
 
 #endif

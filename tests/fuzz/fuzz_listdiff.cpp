@@ -4,7 +4,8 @@
 // The list difference on arbitrary pairs of lists. Byte 0 is the length of
 // the old list, byte 1 the batch size (bit 7: the pure difference instead of
 // the incremental merge), then the ids of the old rows and of the new ones,
-// from a small alphabet so that rows recur. The new list arrives batch by
+// from a small alphabet so that rows recur (bit 5: an id too large for a key).
+// On odd old lengths the merge is keyed, as a model's is. The new list arrives batch by
 // batch; at the end the old list must equal it, and no edit may reach past
 // either list or refresh a row with another item.
 #include "fuzzsupport.h"
@@ -36,9 +37,21 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
     const size_t oldSize = qMin<size_t>(data[0], size - 2);
     Checker checker;
     SynchronizedContent &list = checker.list;
+    QVector<Content> old;
     QVector<Content> source;
     for (size_t i = 2; i < size; ++i)
-        (i < 2 + oldSize ? static_cast<QVector<Content> &>(list) : source).append(Content(new FileData(data[i] & 0x1f, QUrl())));
+        (i < 2 + oldSize ? old : source).append(Content(new FileData(qint64(data[i] & 0x1f) << (data[i] & 0x20 ? 57 : 0), QUrl())));
+    const bool keyed = oldSize & 1;
+    const auto keysOf = [keyed](const QVector<Content> &rows) {
+        QVector<SynchronizedContent::Key> keys;
+        for (int i = 0; keyed && i < rows.size(); ++i)
+            keys << SynchronizedContent::key(rows.at(i));
+        return keys;
+    };
+    QVector<SynchronizedContent::Key> keys = keysOf(old);
+    if (!old.isEmpty())
+        list.merge(old, &checker, keys); // the list as an earlier query left it
+    list.finish(old, &checker, &keys);
 
     if (data[1] & 0x80) {
         int index = 0, sourceIndex = 0;
@@ -48,13 +61,14 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t *data, size_t size)
         QVector<Content> received;
         while (received.size() < source.size()) {
             received += source.mid(received.size(), (data[1] & 0x3f) + 1);
-            list.merge(received, &checker);
+            list.merge(received, &checker, keysOf(received));
             // Rows behind the cursors are settled.
             if (list.index() > list.size() || list.index() != list.sourceIndex() || list.sourceIndex() > received.size()
                 || !std::equal(list.begin(), list.begin() + list.index(), received.begin()))
                 Fuzz::fail(QStringLiteral("rows behind the cursors differ from the source"));
         }
-        list.finish(source, &checker);
+        keys = keysOf(source);
+        list.finish(source, &checker, &keys);
         if (list.index() != 0 || list.sourceIndex() != 0)
             Fuzz::fail(QStringLiteral("cursors not reset by finish"));
     }

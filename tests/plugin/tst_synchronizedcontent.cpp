@@ -32,15 +32,39 @@ QString names(const QVector<Content> &list)
 
 struct RecordingAgent : RecordingList
 {
+    // Keyed: the list comes from an earlier query and keeps its keys, as a model's
+    // does, and the batches bring theirs, so that the walk compares keys.
+    void load(const QVector<Content> &before, bool keyed)
+    {
+        if (!keyed) {
+            list = before;
+            return;
+        }
+        QVector<SynchronizedContent::Key> keys = keysOf(before);
+        if (!before.isEmpty())
+            list.merge(before, this, keys);
+        list.finish(before, this, &keys);
+        operations.clear();
+    }
+
     // Delivers `source` in growing batches of these sizes, the rest at the end of the query.
-    void mergeInBatches(const QVector<Content> &source, const QList<int> &batches)
+    void mergeInBatches(const QVector<Content> &source, const QList<int> &batches, bool keyed)
     {
         QVector<Content> received;
         for (int size : batches) {
             received += source.mid(received.size(), size);
-            list.merge(received, this);
+            list.merge(received, this, keyed ? keysOf(received) : QVector<SynchronizedContent::Key>());
         }
-        list.finish(received + source.mid(received.size()), this);
+        QVector<SynchronizedContent::Key> keys = keyed ? keysOf(source) : QVector<SynchronizedContent::Key>();
+        list.finish(received + source.mid(received.size()), this, &keys);
+    }
+
+    static QVector<SynchronizedContent::Key> keysOf(const QVector<Content> &rows)
+    {
+        QVector<SynchronizedContent::Key> keys;
+        for (const Content &row : rows)
+            keys << SynchronizedContent::key(row);
+        return keys;
     }
 };
 
@@ -82,18 +106,21 @@ private slots:
         QFETCH(QString, after);
         QFETCH(QList<int>, batches);
         QFETCH(QStringList, operations);
-        RecordingAgent agent;
-        agent.list = rows(before);
-        agent.mergeInBatches(rows(after), batches);
-        QVERIFY(agent.valid);
-        QCOMPARE(agent.operations, operations);
-        QCOMPARE(names(agent.list), after);
-        QCOMPARE(agent.list.index(), 0);
-        QCOMPARE(agent.list.sourceIndex(), 0);
+        for (const bool keyed : { false, true }) {
+            RecordingAgent agent;
+            agent.load(rows(before), keyed);
+            agent.mergeInBatches(rows(after), batches, keyed);
+            QVERIFY(agent.valid);
+            QCOMPARE(agent.operations, operations);
+            QCOMPARE(names(agent.list), after);
+            QCOMPARE(agent.list.index(), 0);
+            QCOMPARE(agent.list.sourceIndex(), 0);
+        }
     }
 
-    // Random pairs of lists (same ids across types, reversals, long distances, small
-    // edits) in random batches: the edits must give exactly the new list and its handles.
+    // Random pairs of lists (same ids across types, ids too large for a key, reversals,
+    // long distances, small edits) in random batches, with and without keys: the edits
+    // must give exactly the new list and its handles.
     void randomLists()
     {
         for (int seed = 1; seed <= 2000; ++seed) {
@@ -102,7 +129,7 @@ private slots:
             const auto randomList = [&]() {
                 QVector<Content> list(random.bounded(31));
                 for (Content &content : list)
-                    content = make(random.bounded(ids), random.bounded(2));
+                    content = make(qint64(random.bounded(ids)) << (random.bounded(8) ? 0 : 57), random.bounded(2));
                 return list;
             };
             const QVector<Content> before = randomList();
@@ -124,8 +151,8 @@ private slots:
             for (int delivered = 0; delivered < after.size(); delivered += batches.last())
                 batches << 1 + random.bounded(8);
             RecordingAgent agent;
-            agent.list = before;
-            agent.mergeInBatches(after, batches);
+            agent.load(before, seed % 2);
+            agent.mergeInBatches(after, batches, seed % 2);
             QVERIFY2(agent.valid, qPrintable(QStringLiteral("seed %1: %2").arg(seed).arg(agent.operations.join(", "))));
             QCOMPARE(names(agent.list), names(after));
             for (int i = 0; i < after.size(); ++i)
