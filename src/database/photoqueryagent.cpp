@@ -22,7 +22,7 @@ const QString s_list = s_select + QLatin1String("INNER JOIN image on file.id = i
 Content photoFromRow(const StatementReader &row)
 {
     PhotoData *photo = new PhotoData(row.id(0), QUrl::fromLocalFile(row.text(1)));
-    photo->mimeType = row.text(2);
+    photo->mimeType = row.repeatedText(2);
     photo->fileName = row.text(3);
     photo->displayName = row.text(4);
     photo->permissions = row.integer(5);

@@ -7,6 +7,8 @@
 
 #include <sqlite3.h>
 
+#include <cstring>
+
 StatementReader::StatementReader(QSqlQuery &query, bool direct)
     : m_query(query)
 {
@@ -68,6 +70,19 @@ QString StatementReader::directText(int column) const
     // The index is UTF-8: read as stored, without SQLite's UTF-16 copy.
     const char *text = reinterpret_cast<const char *>(sqlite3_column_text(m_statement, column));
     return QString::fromUtf8(text, sqlite3_column_bytes(m_statement, column));
+}
+
+QString StatementReader::repeatedText(int column) const
+{
+    if (!m_statement || sqlite3_column_type(m_statement, column) != SQLITE_TEXT)
+        return text(column);
+    const char *text = reinterpret_cast<const char *>(sqlite3_column_text(m_statement, column));
+    const int size = sqlite3_column_bytes(m_statement, column);
+    if (size != m_repeatedBytes.size() || std::memcmp(text, m_repeatedBytes.constData(), size_t(size)) != 0) {
+        m_repeatedBytes = QByteArray(text, size);
+        m_repeatedText = QString::fromUtf8(text, size);
+    }
+    return m_repeatedText;
 }
 
 int StatementReader::directInteger(int column) const

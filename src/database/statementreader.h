@@ -26,6 +26,9 @@ public:
 
     QVariant value(int column) const;
     QString text(int column) const { return m_statement ? directText(column) : m_query.value(column).toString(); }
+    // For a column most rows repeat (a MIME type): a text equal to the last one
+    // read here shares that string instead of making its own.
+    QString repeatedText(int column) const;
     int integer(int column) const { return m_statement ? directInteger(column) : m_query.value(column).toInt(); }
     // The id column as qint64; 0 when it can't be converted.
     qint64 id(int column) const;
@@ -37,6 +40,8 @@ private:
     QSqlQuery &m_query;
     sqlite3_stmt *m_direct = nullptr;   // the statement, once the first row is read
     sqlite3_stmt *m_statement = nullptr; // set while its rows are the current ones
+    mutable QByteArray m_repeatedBytes;
+    mutable QString m_repeatedText;
     bool m_started = false;
     bool m_done = false;
 };
