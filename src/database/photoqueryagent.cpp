@@ -3,6 +3,7 @@
 
 #include "photoqueryagent.h"
 
+#include "rowpipeline.h"
 #include "statementreader.h"
 
 namespace {
@@ -19,7 +20,9 @@ const QString s_byPath = s_select + QLatin1String("LEFT JOIN photo ON file.id = 
 const QString s_bySource = s_select + QLatin1String("LEFT JOIN photo ON file.id = photo.fileId WHERE file.id IN (SELECT fileId FROM download WHERE source = ?);");
 const QString s_list = s_select + QLatin1String("INNER JOIN image on file.id = image.fileId ORDER BY image.dateTaken;");
 
-Content photoFromRow(const StatementReader &row)
+// Reads a StatementReader or a copy of its rows.
+template <typename Row>
+Content photoFromRow(const Row &row)
 {
     PhotoData *photo = new PhotoData(row.id(0), QUrl::fromLocalFile(row.text(1)));
     photo->mimeType = row.repeatedText(2);
@@ -76,6 +79,6 @@ bool PhotoQueryAgent::query(QueryAgent::Recipient *recipient, const QueryAgent::
         return false;
     }
     StatementReader rows(query, true);
-    deliver(rows, recipient, photoFromRow);
+    RowPipeline::deliver(rows, recipient, photoFromRow<StatementReader>, photoFromRow<RowCopy::Row>);
     return true;
 }

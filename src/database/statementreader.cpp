@@ -7,8 +7,6 @@
 
 #include <sqlite3.h>
 
-#include <cstring>
-
 StatementReader::StatementReader(QSqlQuery &query, bool direct)
     : m_query(query)
 {
@@ -43,53 +41,49 @@ bool StatementReader::next()
     return false;
 }
 
-QVariant StatementReader::value(int column) const
+SqlCell StatementReader::cell(int column) const
 {
-    if (!m_statement)
-        return m_query.value(column);
-    // As the driver makes them.
-    switch (sqlite3_column_type(m_statement, column)) {
+    SqlCell cell;
+    cell.type = sqlite3_column_type(m_statement, column);
+    switch (cell.type) {
     case SQLITE_INTEGER:
-        return qint64(sqlite3_column_int64(m_statement, column));
+        cell.integer = sqlite3_column_int64(m_statement, column);
+        break;
     case SQLITE_FLOAT:
-        return sqlite3_column_double(m_statement, column);
-    case SQLITE_NULL:
-        return QVariant(QVariant::String);
+        cell.real = sqlite3_column_double(m_statement, column);
+        break;
+    case SQLITE_TEXT:
+        cell.bytes = reinterpret_cast<const char *>(sqlite3_column_text(m_statement, column));
+        cell.size = sqlite3_column_bytes(m_statement, column);
+        break;
     case SQLITE_BLOB:
-        return QByteArray(static_cast<const char *>(sqlite3_column_blob(m_statement, column)),
-                          sqlite3_column_bytes(m_statement, column));
+        cell.bytes = static_cast<const char *>(sqlite3_column_blob(m_statement, column));
+        cell.size = sqlite3_column_bytes(m_statement, column);
+        break;
     default:
-        return directText(column);
+        break;
     }
+    return cell;
 }
 
-QString StatementReader::directText(int column) const
+QVariant StatementReader::value(int column) const
 {
-    if (sqlite3_column_type(m_statement, column) != SQLITE_TEXT)
-        return value(column).toString();
-    // The index is UTF-8: read as stored, without SQLite's UTF-16 copy.
-    const char *text = reinterpret_cast<const char *>(sqlite3_column_text(m_statement, column));
-    return QString::fromUtf8(text, sqlite3_column_bytes(m_statement, column));
+    return m_statement ? cell(column).value() : m_query.value(column);
+}
+
+QString StatementReader::text(int column) const
+{
+    return m_statement ? cell(column).text() : m_query.value(column).toString();
 }
 
 QString StatementReader::repeatedText(int column) const
 {
-    if (!m_statement || sqlite3_column_type(m_statement, column) != SQLITE_TEXT)
-        return text(column);
-    const char *text = reinterpret_cast<const char *>(sqlite3_column_text(m_statement, column));
-    const int size = sqlite3_column_bytes(m_statement, column);
-    if (size != m_repeatedBytes.size() || std::memcmp(text, m_repeatedBytes.constData(), size_t(size)) != 0) {
-        m_repeatedBytes = QByteArray(text, size);
-        m_repeatedText = QString::fromUtf8(text, size);
-    }
-    return m_repeatedText;
+    return m_statement ? cell(column).repeatedText(&m_repeatedBytes, &m_repeatedText) : text(column);
 }
 
-int StatementReader::directInteger(int column) const
+int StatementReader::integer(int column) const
 {
-    if (sqlite3_column_type(m_statement, column) != SQLITE_INTEGER)
-        return value(column).toInt();
-    return int(sqlite3_column_int64(m_statement, column));
+    return m_statement ? cell(column).toInt() : m_query.value(column).toInt();
 }
 
 qint64 StatementReader::id(int column) const
@@ -97,4 +91,16 @@ qint64 StatementReader::id(int column) const
     bool ok = false;
     const qint64 id = value(column).toLongLong(&ok);
     return ok ? id : 0;
+}
+
+void StatementReader::copyRow(RowCopy *copy) const
+{
+    const int columns = sqlite3_column_count(m_statement);
+    for (int column = 0; column < columns; ++column)
+        copy->append(cell(column));
+}
+
+int StatementReader::columnCount() const
+{
+    return m_statement ? sqlite3_column_count(m_statement) : 0;
 }

@@ -4,6 +4,8 @@
 #ifndef STATEMENTREADER_H
 #define STATEMENTREADER_H
 
+#include "rowcopy.h"
+
 #include <QSqlQuery>
 #include <QString>
 #include <QVariant>
@@ -25,17 +27,23 @@ public:
     bool next();
 
     QVariant value(int column) const;
-    QString text(int column) const { return m_statement ? directText(column) : m_query.value(column).toString(); }
+    QString text(int column) const;
     // For a column most rows repeat (a MIME type): a text equal to the last one
     // read here shares that string instead of making its own.
     QString repeatedText(int column) const;
-    int integer(int column) const { return m_statement ? directInteger(column) : m_query.value(column).toInt(); }
+    int integer(int column) const;
     // The id column as qint64; 0 when it can't be converted.
     qint64 id(int column) const;
 
+    // Whether the current row is read from the statement itself; only then
+    // can it be copied.
+    bool isDirect() const { return m_statement != nullptr; }
+    int columnCount() const;
+    // Appends every column of the current, direct row to `copy`.
+    void copyRow(RowCopy *copy) const;
+
 private:
-    QString directText(int column) const;
-    int directInteger(int column) const;
+    SqlCell cell(int column) const;
 
     QSqlQuery &m_query;
     sqlite3_stmt *m_direct = nullptr;   // the statement, once the first row is read

@@ -1,0 +1,162 @@
+// SPDX-FileCopyrightText: 2026 The themelet authors
+// SPDX-License-Identifier: LGPL-2.1-or-later
+
+#include "rowpipeline.h"
+
+#include <QMutex>
+#include <QQueue>
+#include <QWaitCondition>
+
+#include <thread>
+
+namespace {
+
+// Copies waiting to be made records, at most this many, so that a slow
+// converter holds the statement back instead of piling copies up.
+const int s_queued = 8;
+
+class Converter
+{
+public:
+    explicit Converter(RowPipeline::ConvertCopy convert)
+        : m_convert(convert)
+        , m_thread([this]() { run(); })
+    {
+    }
+
+    ~Converter()
+    {
+        close();
+        m_thread.join();
+        qDeleteAll(m_spare);
+    }
+
+    // An emptied copy to fill, if the converter has one to give back.
+    RowCopy *spare(int columns)
+    {
+        QMutexLocker locker(&m_mutex);
+        return m_spare.isEmpty() ? new RowCopy(columns) : m_spare.dequeue();
+    }
+
+    void put(RowCopy *copy)
+    {
+        QMutexLocker locker(&m_mutex);
+        while (m_copies.size() >= s_queued)
+            m_changed.wait(&m_mutex);
+        m_copies.enqueue(copy);
+        ++m_outstanding;
+        m_changed.wakeAll();
+    }
+
+    void close()
+    {
+        QMutexLocker locker(&m_mutex);
+        m_closed = true;
+        m_changed.wakeAll();
+    }
+
+    // Delivers the batches made so far; with `all`, waits for every one put.
+    void deliver(QueryAgent::Recipient *recipient, bool all)
+    {
+        for (;;) {
+            QQueue<QVector<Content>> batches;
+            {
+                QMutexLocker locker(&m_mutex);
+                while (all && m_outstanding > 0 && m_batches.isEmpty())
+                    m_changed.wait(&m_mutex);
+                batches.swap(m_batches);
+                m_outstanding -= batches.size();
+            }
+            // Outside the lock: the recipient takes its own.
+            while (!batches.isEmpty())
+                recipient->contentQueried(batches.dequeue());
+            QMutexLocker locker(&m_mutex);
+            if (!all || m_outstanding == 0)
+                return;
+        }
+    }
+
+private:
+    void run()
+    {
+        RowCopy::Row row;
+        for (;;) {
+            RowCopy *copy = nullptr;
+            {
+                QMutexLocker locker(&m_mutex);
+                while (m_copies.isEmpty() && !m_closed)
+                    m_changed.wait(&m_mutex);
+                if (m_copies.isEmpty())
+                    return;
+                copy = m_copies.dequeue();
+                m_changed.wakeAll();
+            }
+            QVector<Content> batch;
+            batch.reserve(copy->rows());
+            for (int i = 0; i < copy->rows(); ++i) {
+                row.set(copy, i);
+                batch.append(m_convert(row));
+            }
+            copy->clear();
+            QMutexLocker locker(&m_mutex);
+            m_spare.enqueue(copy);
+            m_batches.enqueue(batch);
+            m_changed.wakeAll();
+        }
+    }
+
+    const RowPipeline::ConvertCopy m_convert;
+    QMutex m_mutex;
+    QWaitCondition m_changed;
+    QQueue<RowCopy *> m_copies;
+    QQueue<RowCopy *> m_spare;
+    QQueue<QVector<Content>> m_batches;
+    int m_outstanding = 0; // put, not yet delivered
+    bool m_closed = false;
+    std::thread m_thread; // last: starts once the rest is there
+};
+
+}
+
+void RowPipeline::deliver(StatementReader &rows, QueryAgent::Recipient *recipient, ConvertRow convertRow,
+                          ConvertCopy convertCopy)
+{
+    const int size = QueryAgent::BatchSize;
+    QVector<Content> batch;
+    batch.reserve(size);
+    bool more = true;
+    // The first batch here: a short list isn't worth a thread.
+    while (more && batch.size() < size) {
+        more = rows.next();
+        if (more)
+            batch.append(convertRow(rows));
+    }
+    recipient->contentQueried(batch);
+    if (!more)
+        return;
+
+    const int columns = rows.columnCount();
+    if (!rows.isDirect() || columns < 1) {
+        for (;;) {
+            batch.clear();
+            while (batch.size() < size && (more = rows.next()))
+                batch.append(convertRow(rows));
+            recipient->contentQueried(batch);
+            if (!more)
+                return;
+        }
+    }
+
+    Converter converter(convertCopy);
+    for (;;) {
+        RowCopy *copy = converter.spare(columns);
+        while (copy->rows() < size && (more = rows.next()))
+            rows.copyRow(copy);
+        converter.put(copy);
+        converter.deliver(recipient, false);
+        if (!more)
+            break;
+    }
+    converter.close();
+    converter.deliver(recipient, true);
+}
