@@ -7,7 +7,8 @@
 
 #include <condition_variable>
 #include <mutex>
-#include <thread>
+
+#include <pthread.h>
 
 namespace {
 
@@ -22,18 +23,23 @@ const int s_queued = 8;
 class Converter
 {
 public:
+    // Without a thread (none could be made), started() is false and nothing may be put.
     explicit Converter(RowPipeline::ConvertCopy convert)
         : m_convert(convert)
-        , m_thread([this]() { run(); })
     {
+        m_started = pthread_create(&m_thread, nullptr, &Converter::start, this) == 0;
     }
 
     ~Converter()
     {
-        close();
-        m_thread.join();
+        if (m_started) {
+            close();
+            pthread_join(m_thread, nullptr);
+        }
         qDeleteAll(m_spare);
     }
+
+    bool started() const { return m_started; }
 
     // An emptied copy to fill, if the converter has one to give back.
     RowCopy *spare(int columns)
@@ -81,6 +87,12 @@ public:
     }
 
 private:
+    static void *start(void *converter)
+    {
+        static_cast<Converter *>(converter)->run();
+        return nullptr;
+    }
+
     void run()
     {
         RowCopy::Row row;
@@ -117,7 +129,8 @@ private:
     QQueue<QVector<Content>> m_batches;
     int m_outstanding = 0; // put, not yet delivered
     bool m_closed = false;
-    std::thread m_thread; // last: starts once the rest is there
+    bool m_started = false;
+    pthread_t m_thread;
 };
 
 }
@@ -139,8 +152,8 @@ void RowPipeline::deliver(StatementReader &rows, QueryAgent::Recipient *recipien
     if (!more)
         return;
 
-    const int columns = rows.columnCount();
-    if (!rows.isDirect() || columns < 1) {
+    // The rest converted here, as QueryAgent::deliver() does.
+    const auto deliverHere = [&]() {
         for (;;) {
             batch.clear();
             while (batch.size() < size && (more = rows.next()))
@@ -149,9 +162,14 @@ void RowPipeline::deliver(StatementReader &rows, QueryAgent::Recipient *recipien
             if (!more)
                 return;
         }
-    }
-
+    };
+    const int columns = rows.columnCount();
+    if (!rows.isDirect() || columns < 1)
+        return deliverHere();
     Converter converter(convertCopy);
+    if (!converter.started())
+        return deliverHere();
+
     for (;;) {
         RowCopy *copy = converter.spare(columns);
         while (copy->rows() < size && (more = rows.next()))
