@@ -50,19 +50,19 @@ public:
     static qint64 idFromColumn(const QSqlQuery &query, int column);
 
 protected:
-    // Delivers the executed statement's rows (a QSqlQuery or a StatementReader
-    // over one) in batches of BatchSize; always ends with the batch that follows
-    // the last row, so an empty result is one call.
-    template <typename Rows, typename Convert, typename BeforeDelivery>
-    static void deliver(Rows &rows, Recipient *recipient, Convert convert, BeforeDelivery beforeDelivery)
+    // Delivers the executed statement's rows in batches of BatchSize; always ends
+    // with the batch that follows the last row, so an empty result is one call.
+    template <typename Convert, typename BeforeDelivery>
+    static void deliver(QSqlQuery &query, Recipient *recipient, Convert convert,
+                        BeforeDelivery beforeDelivery)
     {
         QVector<Content> batch;
         batch.reserve(BatchSize);
         bool more = true;
         while (more) {
-            more = rows.next();
+            more = query.next();
             if (more)
-                batch.append(convert(rows));
+                batch.append(convert(query));
             if (!more || batch.size() == BatchSize) {
                 beforeDelivery(batch);
                 recipient->contentQueried(batch);
@@ -72,10 +72,10 @@ protected:
         }
     }
 
-    template <typename Rows, typename Convert>
-    static void deliver(Rows &rows, Recipient *recipient, Convert convert)
+    template <typename Convert>
+    static void deliver(QSqlQuery &query, Recipient *recipient, Convert convert)
     {
-        deliver(rows, recipient, convert, [](QVector<Content> &) {});
+        deliver(query, recipient, convert, [](QVector<Content> &) {});
     }
 
     // For a local URL binds (directory, file name), else the URL text, to the

@@ -7,6 +7,7 @@
 
 #include <condition_variable>
 #include <mutex>
+#include <optional>
 
 #include <pthread.h>
 
@@ -142,43 +143,36 @@ void RowPipeline::deliver(StatementReader &rows, QueryAgent::Recipient *recipien
     QVector<Content> batch;
     batch.reserve(size);
     bool more = true;
-    // The first batch here: a short list isn't worth a thread.
-    while (more && batch.size() < size) {
-        more = rows.next();
-        if (more)
-            batch.append(convertRow(rows));
-    }
-    recipient->contentQueried(batch);
-    if (!more)
-        return;
-
-    // The rest converted here, as QueryAgent::deliver() does.
+    // One batch converted here, as QueryAgent::deliver() does; false once the rows ended.
     const auto deliverHere = [&]() {
-        for (;;) {
-            batch.clear();
-            while (batch.size() < size && (more = rows.next()))
-                batch.append(convertRow(rows));
-            recipient->contentQueried(batch);
-            if (!more)
-                return;
-        }
+        batch.clear();
+        while (batch.size() < size && (more = rows.next()))
+            batch.append(convertRow(rows));
+        recipient->contentQueried(batch);
+        return more;
     };
-    const int columns = rows.columnCount();
-    if (!rows.isDirect() || columns < 1)
-        return deliverHere();
-    Converter converter(convertCopy);
-    if (!converter.started())
-        return deliverHere();
+    // The first batch here: a short list isn't worth a thread.
+    if (!deliverHere())
+        return;
+    // Copies need the statement itself, and a thread.
+    const int columns = rows.isDirect() ? rows.columnCount() : 0;
+    std::optional<Converter> converter;
+    if (columns > 0)
+        converter.emplace(convertCopy);
+    if (!converter || !converter->started()) {
+        while (deliverHere()) {}
+        return;
+    }
 
     for (;;) {
-        RowCopy *copy = converter.spare(columns);
+        RowCopy *copy = converter->spare(columns);
         while (copy->rows() < size && (more = rows.next()))
             rows.copyRow(copy);
-        converter.put(copy);
-        converter.deliver(recipient, false);
+        converter->put(copy);
+        converter->deliver(recipient, false);
         if (!more)
             break;
     }
-    converter.close();
-    converter.deliver(recipient, true);
+    converter->close();
+    converter->deliver(recipient, true);
 }
