@@ -6,6 +6,7 @@
 #include "contentprinter.h"
 #include "themeletinterface.h"
 
+#include <QCoreApplication>
 #include <QDBusConnectionInterface>
 #include <QDBusError>
 #include <QDBusReply>
@@ -102,5 +103,13 @@ bool ServiceClient::wait(QDBusPendingCall call)
         return true;
     const QDBusError error = call.error();
     m_error = oneLine(error.message().isEmpty() ? error.name() : error.message());
+    // Qt's D-Bus thread wakes us before it has told its own listeners of the
+    // failure; a round trip on the same thread lets it finish, so that exiting
+    // right after an error reply leaves nothing of the call behind.
+    connection().call(QDBusMessage::createMethodCall(QStringLiteral("org.freedesktop.DBus"),
+                                                     QStringLiteral("/org/freedesktop/DBus"),
+                                                     QStringLiteral("org.freedesktop.DBus.Peer"),
+                                                     QStringLiteral("Ping")));
+    QCoreApplication::sendPostedEvents();
     return false;
 }
