@@ -7,9 +7,5 @@
         <source>themelet-la-sunset</source>
         <translation>Auringonlasku</translation>
     </message>
-    <message>
-        <source>themelet-la-dusk</source>
-        <translation type="unfinished"></translation>
-    </message>
 </context>
 </TS>
