@@ -6,9 +6,11 @@
 #include "profiledefaults.h"
 #include "profilemanager.h"
 
+#include <QRect>
 #include <QtTest>
 
 static const QString s_tree = QStringLiteral("/org/orbaline/themelet/"), s_profiles = s_tree + "profiles/";
+static const QString s_items = QStringLiteral("/org/orbaline/test/items/");
 static const QStringList s_tones { "ringing", "sms", "im", "email", "voip", "calendar", "clock" };
 static QStringList s_calls;
 static int s_freed = 0;
@@ -22,24 +24,6 @@ static void recordValue(const char *profile, const char *key, const char *value,
     s_calls << QStringList { static_cast<const char *>(tag), text(profile), text(key), text(value), text(type) }.join(' ');
 }
 
-// Every signal of an object by name, in the order they come.
-class SignalLog : public QObject
-{
-    Q_OBJECT
-public:
-    explicit SignalLog(QObject *object)
-    {
-        for (int i = QObject::staticMetaObject.methodCount(); i < object->metaObject()->methodCount(); ++i) {
-            if (object->metaObject()->method(i).methodType() == QMetaMethod::Signal)
-                QMetaObject::connect(object, i, this, staticMetaObject.indexOfSlot("record()"));
-        }
-    }
-    QStringList names;
-
-private slots:
-    void record() { names << QString::fromLatin1(sender()->metaObject()->method(senderSignalIndex()).name()); }
-};
-
 // Whether the test's change callback hears a value written by another process: only while the tracker runs.
 static bool trackerRuns()
 {
@@ -52,6 +36,21 @@ static bool trackerRuns()
 class tst_ProfileManager : public QObject
 {
     Q_OBJECT
+    QStringList m_signals;
+
+    // From now on every signal of the object, by name, in the order they come.
+    void logSignals(QObject *object)
+    {
+        m_signals.clear();
+        for (int i = QObject::staticMetaObject.methodCount(); i < object->metaObject()->methodCount(); ++i) {
+            if (object->metaObject()->method(i).methodType() == QMetaMethod::Signal)
+                QMetaObject::connect(object, i, this, staticMetaObject.indexOfSlot("record()"));
+        }
+    }
+
+public slots: // not a test function
+    void record() { m_signals << QString::fromLatin1(sender()->metaObject()->method(senderSignalIndex()).name()); }
+
 private slots:
     void initTestCase()
     {
@@ -66,9 +65,64 @@ private slots:
     void init()
     {
         DConfTest::reset(s_tree);
+        DConfTest::reset(s_items);
         QVERIFY(DConfTest::barrier());
         s_calls.clear();
         QCOMPARE(profile_tracker_init(), 0);
+    }
+
+    // A key-value item, the store's other client. Rows of the types that profile values don't go through.
+    void roundTrip_data()
+    {
+        QTest::addColumn<QVariant>("value");
+        QTest::addColumn<QString>("stored"); // in GVariant text form
+        QTest::newRow("int64") << QVariant(5000000000LL) << "int64 5000000000";
+        QTest::newRow("double") << QVariant(2.5) << "2.5";
+        QTest::newRow("string list") << QVariant(QStringList { "a", "b" }) << "['a', 'b']";
+    }
+
+    // Every change of a key, made here or by another process, arrives later as one
+    // valueChanged() at every item of the key; values keep their type.
+    void roundTrip()
+    {
+        QFETCH(QVariant, value);
+        QFETCH(QString, stored);
+        MGConfItem item(s_items + "key"), other(item.key()), unrelated(s_items + "key2");
+        QSignalSpy spy(&item, &MGConfItem::valueChanged), otherSpy(&other, &MGConfItem::valueChanged);
+        QSignalSpy unrelatedSpy(&unrelated, &MGConfItem::valueChanged);
+        const auto counts = [&] { return QString("%1 %2 %3").arg(spy.count()).arg(otherSpy.count()).arg(unrelatedSpy.count()); };
+        const auto typed = [](const QVariant &read) { return QVariantList { read, read.userType() }; };
+
+        item.set(value);
+        QCOMPARE(spy.count(), 0);
+        QCOMPARE(typed(item.value()), typed(value));
+        QCOMPARE(DConfTest::read(item.key()), stored);
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(counts(), QString("1 1 0"));
+
+        item.set(QVariant());
+        QVERIFY(!item.value().isValid() && DConfTest::read(item.key()).isEmpty());
+        DConfTest::write(item.key(), stored);
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(typed(other.value()), typed(value));
+        QCOMPARE(counts(), QString("3 3 0"));
+
+        // A directory above the key reset; an item deleted before its notice arrives.
+        DConfTest::reset(s_items);
+        std::unique_ptr<MGConfItem>(new MGConfItem(item.key()))->set(value);
+        QVERIFY(DConfTest::barrier());
+        QCOMPARE(item.value(), value);
+        QCOMPARE(counts(), QString("5 5 1")); // the other key hears only of its directory
+    }
+
+    // A value the store can't hold is refused, and the stored one kept.
+    void unsupportedType()
+    {
+        MGConfItem item(s_items + "typed");
+        item.set("kept");
+        QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^bool DConfStore::write\\(.*\\) Unsupported value type QRect"));
+        item.set(QRect(1, 2, 3, 4));
+        QCOMPARE(item.value(), QVariant("kept"));
     }
 
     // The first object starts the tracker and the last one stops it, counting objects only: a
@@ -132,10 +186,10 @@ private slots:
                                  QString::number(manager.mailToneEnabled()) }.join(' ');
         };
         QCOMPARE(readAll(), read.isEmpty() ? read : "0 /cached.ogg /chat.ogg 0");
-        SignalLog log(&manager);
+        logSignals(&manager);
         DConfTest::write(s_profiles + path, value);
         QVERIFY(DConfTest::barrier());
-        QCOMPARE(log.names.join(' '), signalNames);
+        QCOMPARE(m_signals.join(' '), signalNames);
         QCOMPARE(readAll(), read);
     }
 
@@ -144,7 +198,7 @@ private slots:
     void cacheAndWrites()
     {
         ProfileManager manager;
-        SignalLog log(&manager);
+        logSignals(&manager);
         QCOMPARE(manager.ringerVolume(), 80);
         QCOMPARE(manager.ringerVolume(), 80);
         manager.setRingerToneFile("/a.ogg");
@@ -155,7 +209,7 @@ private slots:
         manager.setRingerVolume(40);
         manager.setProfile(ProfileManager::Silent);
         manager.setProfile(ProfileManager::Silent);
-        QCOMPARE(log.names.join(' '), "ringerVolumeChanged ringerToneFileChanged ringerToneFileChanged ringerToneFileChanged "
+        QCOMPARE(m_signals.join(' '), "ringerVolumeChanged ringerToneFileChanged ringerToneFileChanged ringerToneFileChanged "
                                       "ringerVolumeChanged profileChanged");
     }
 
@@ -195,14 +249,14 @@ private slots:
         QCOMPARE(manager.chatToneFile(), "/t.ogg");
 
         s_calls.clear();
-        SignalLog log(&manager);
+        logSignals(&manager);
         if (keys.isEmpty())
             QTest::ignoreMessage(QtWarningMsg, qPrintable("void ProfileManager::" + call + "(ProfileManager::ToneId) Unknown tone id!"));
         if (call == "clear")
             manager.clear();
         else
             (manager.*(call == "clearTone" ? &ProfileManager::clearTone : &ProfileManager::clearToneSettings))(ProfileManager::ToneId(id));
-        QCOMPARE(log.names, QStringList());
+        QCOMPARE(m_signals, QStringList());
         QCOMPARE(manager.ringerVolume(), 5);
         QVERIFY(DConfTest::barrier());
         QCOMPARE(s_calls.replaceInStrings(QRegularExpression("^active general (\\S+) .*$"), "\\1").join(' '), keys);
