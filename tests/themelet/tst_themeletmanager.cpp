@@ -101,20 +101,20 @@ private slots:
         const char *defaults = "1|80|-1|1|NULL|NULL|NULL|NULL|NULL|now";
         add("only wallpaper", R"("w.jpg")", defaults);
         add("wallpaper linked out of the package", R"("out.jpg")", "");
-        add("volume 150, not favourite, timestamp normalised", R"("w.jpg", "ringerVolume": 150, "favorite": false, "partnerSpace": "p", )"
-            R"("timestamp": "2014-05-01T12:00:00.250Z", "displayName": "Edge", "highlightColor": "#112233", )"
+        add("volume 150, not favourite, timestamp normalised, surrogates", R"("w.jpg", "ringerVolume": 150, "favorite": false, )"
+            R"("timestamp": "2014-05-01T12:00:00.250Z", "partnerSpace": "a\ud800b\udc00", "highlightColor": "#112233", )"
             R"("secondaryHighlightColor": "#445566", "primaryColor": "#778899", "secondaryColors": "#80aabbcc")",
-            "0|150|-1|1|#112233|#445566|#778899|#80aabbcc|p|2014-05-01T12:00:00Z");
+            "0|150|-1|1|#112233|#445566|#778899|#80aabbcc|a\uFFFDb\uFFFD|2014-05-01T12:00:00Z");
         // Only the ringer has a fallback tone, which an empty object doesn't reach.
         add("empty tone object, enabled false is no number", R"("w.jpg", "ringerToneFile": {}, )"
             R"("messageToneFile": {"file": "dusk.ogg", "enabled": false})", defaults, { "messageToneFile|dusk.ogg" });
         add("empty file falls back", R"("w.jpg", "ringerToneFile": {"enabled": 1})", defaults,
             { "ringerToneFile|fallback-ringer.ogg" });
         add("disabled: an empty file, a kept resource", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0}, )"
-            R"("messageToneFile": {"file": "dusk.ogg", "enabled": 0})", "1|80|-4|1|NULL|NULL|NULL|NULL|NULL|now", { "messageToneFile|dusk.ogg" });
+            R"("messageToneFile": {"file": "dusk.ogg", "enabled": 0})", "1|80|-4|1|NULL|NULL|NULL|NULL|NULL|now",
+            { "messageToneFile|dusk.ogg" });
         add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
             R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
-        add("unpaired surrogates", R"("w.jpg", "partnerSpace": "a\ud800b\udc00")", "1|80|-1|1|NULL|NULL|NULL|NULL|a\uFFFDb\uFFFD|now");
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
             R"("highlightColor": {"a": 1}, "ringerVolume": 60.5, "partnerSpace": 7, "timestamp": "yesterday", "version": "3", )"
             R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|NULL|NULL|NULL|now");
