@@ -234,15 +234,14 @@ private slots:
             read);
         add("favourite off; tones off, high bits kept", "", { { "favorite", false }, { "messageToneEnabled", false },
             { "clockAlarmToneEnabled", 0 } }, "Plain|0|NULL|1|NULL|NULL|80|-67|p|1");
-        add("favourite on", "favorite = 0", { { "favorite", true } }, "Plain|1|now|1|NULL|NULL|80|-1|p|1");
         const auto url = [](const QVariant &url) { return QVariantMap { { "url", url } }; };
-        add("resources", "", { { "resources", QVariantMap {
+        add("favourite on; resources", "favorite = 0", { { "favorite", true }, { "resources", QVariantMap {
                 { "ringerToneFile", url(QUrl::fromLocalFile(user("a.ogg"))) },
                 { "mailToneFile", url(user("b b.ogg")) }, // a plain path
                 { "messageToneFile", url(QUrl()) },       // deletes
                 { "chatToneFile", url(QUrl("http://example.com/x.ogg")) },
                 { "calendarToneFile", url(QUrl::fromLocalFile(user("gone.ogg"))) } } } },
-            read, { "clockAlarmToneFile|dusk.ogg", "mailToneFile|b b.ogg", "ringerToneFile|a.ogg" });
+            "Plain|1|now|1|NULL|NULL|80|-1|p|1", { "clockAlarmToneFile|dusk.ogg", "mailToneFile|b b.ogg", "ringerToneFile|a.ogg" });
     }
 
     void save()
