@@ -36,10 +36,10 @@ class tst_ThemeletManager : public QObject
     ThemeletManager *m_manager = nullptr;
     TestDatabase m_db { serviceIndex() };
 
-    // Package <name>: images/w.jpg, sounds/dusk.ogg, both also one level deeper, out.jpg and out.ogg linked outside.
+    // Package <name>: images/w.jpg, sounds/dusk.ogg, a directory sounds/sounds, out.jpg and out.ogg linked outside.
     qint64 addThemelet(const QString &name, const QByteArray &json, bool read = false)
     {
-        writeTree(package(name), { "images/w.jpg", "images/images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
+        writeTree(package(name), { "images/w.jpg", "sounds/dusk.ogg", "sounds/sounds/dusk.ogg" });
         const QString outside = user("outside");
         write(outside);
         QFile::link(outside, package(name) + "/images/out.jpg");
