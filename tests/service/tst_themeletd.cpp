@@ -8,9 +8,14 @@
 #include "profiledefaults.h"
 #include "sysroot.h"
 
+#include <QDBusArgument>
+#include <QDBusObjectPath>
+#include <QDBusVariant>
 #include <QPainter>
+#include <QRandomGenerator>
 
 #include <memory>
+#include <sys/stat.h>
 
 using namespace Fixture;
 
@@ -40,6 +45,23 @@ class tst_Themeletd : public QObject
         }, 20000);
         m_signals.clear();
         return ok;
+    }
+
+    // One hostile call: it must be answered, by a reply or an error, and the service must live.
+    void attack(const QString &method, const QVariantList &arguments, const QString &interface = Service::Name)
+    {
+        if (QTest::currentTestFailed())
+            return;
+        const QDBusMessage answer = Service::call(method, arguments, 30000, interface);
+        const QString error = answer.errorName();
+        const bool answered = answer.type() == QDBusMessage::ReplyMessage
+                || (answer.type() == QDBusMessage::ErrorMessage && error != "org.freedesktop.DBus.Error.NoReply"
+                    && error != "org.freedesktop.DBus.Error.ServiceUnknown");
+        if (answered && Service::ownerPid() == m_service.processId())
+            return;
+        QString shown;
+        QDebug(&shown) << method << arguments;
+        QFAIL(qPrintable(shown.left(300) + ": " + error + ' ' + answer.errorMessage()));
     }
 
 public slots:
@@ -288,6 +310,106 @@ private slots:
         if ((method == "saveAttributes" || method == "remove") && type >= 0 && type <= 4 && type != 3)
             QTRY_VERIFY(m_signals.contains(type));
         QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
+    }
+
+    // Wrong types and arity, unknown methods, ids and types, URLs that are no local files or lead elsewhere, huge or
+    // deeply nested maps: every call is answered, the service lives on, nothing changes outside its places (the index
+    // and wallpapers under data/, dconf under config/), and a normal client is still served.
+    void hostileCalls()
+    {
+        const QString victim = m_sandbox + "/victim", keep = victim + "/keep.jpg", tone = victim + "/keep.ogg";
+        QVERIFY(write(keep, "precious") && write(tone, "precious") && mkfifo(qPrintable(victim + "/fifo"), 0600) == 0);
+        const qlonglong file = query("SELECT min(fileId) FROM image").toLongLong();
+        const QRegularExpression places("^" + QRegularExpression::escape(m_sandbox) + "/(data|config|cache|runtime)(/|$)");
+        const auto snapshot = [&]() {
+            QStringList entries;
+            for (QDirIterator it(m_sandbox, QDir::AllEntries | QDir::Hidden | QDir::System | QDir::NoDotAndDotDot,
+                                 QDirIterator::Subdirectories); it.hasNext();) {
+                const QFileInfo info(it.next());
+                if (!places.match(info.filePath()).hasMatch())
+                    entries << QStringLiteral("%1|%2|%3").arg(info.filePath()).arg(info.isDir() ? 0 : info.size())
+                                       .arg(info.lastModified().toMSecsSinceEpoch());
+            }
+            entries.sort();
+            return entries;
+        };
+        const QStringList before = snapshot();
+        const auto nested = [](int depth, QVariant value) {
+            while (depth-- > 0)
+                value = QVariantMap { { "resources", value } };
+            return value.toMap();
+        };
+        const QStringList urls { "", "relative/a.jpg", "../../etc/passwd", m_watched + "/../victim/keep.jpg",
+            "file://" + m_watched + "/../../victim/keep.jpg", "file:relative.jpg", "file://otherhost/etc/passwd", "http://example.com/a.jpg",
+            "data:image/png;base64,AAAA", "/", "/proc/self/mem", "/dev/zero", victim + "/fifo", victim, keep, tone, m_watched + "/new.jpg",
+            m_package + "/sunset.themelet", "file://" + m_package + "/images/sunset.jpg", QString(64 * 1024, 'a'), "/" + QString(5000, 'b'),
+            QString::fromUtf8("/t\xc3\xa4st/\xe2\x80\x8f.jpg"), "file:///%2e%2e/%2e%2e/etc/passwd", "file:///tmp/a%2Fb.jpg", "\n/etc/passwd" };
+        for (const QString &url : urls) {
+            for (const char *method : { "createThemelet", "indexFile", "installPackage", "setThemelet" })
+                attack(method, { url });
+            attack("setFavorite", { url, true });
+            attack("setFavorite", { url, false });
+        }
+        // Unknown and known ids and types, with values that aren't what the keys want.
+        // Containers that the demarshalling must flatten or refuse: a structure, a map with integer keys.
+        QDBusArgument structure, intKeys;
+        structure.beginStructure();
+        structure << 1 << QString("s") << QDBusVariant(QVariantList { 2.5, "x" });
+        structure.endStructure();
+        intKeys.beginMap(QVariant::Int, qMetaTypeId<QDBusVariant>());
+        intKeys.beginMapEntry();
+        intKeys << 7 << QDBusVariant(QVariantMap { { "url", tone } });
+        intKeys.endMapEntry();
+        intKeys.endMap();
+        const auto resource = [&](const QString &key, const QVariant &url) { return nested(1, QVariantMap { { key, QVariantMap { { "url", url } } } }); };
+        const QList<QVariantMap> maps { {}, { { "displayName", 5 } }, { { "displayName", QString(100000, 'n') } }, { { "ringerVolume", 1e300 } },
+            { { "ringerVolume", "60" } }, { { "highlightColor", "#12" } }, { { "homeWallpaper", keep } }, { { "url", "file://" + keep } },
+            { { "resources", 5 } }, resource("ringerToneFile", tone), resource("ringerToneFile", "../../keep.ogg"), resource("bogusFile", tone),
+            resource("File", 1), { { "unknownKey", QVariantList { 1, "two", QVariantMap { { "three", 3.0 } } } } },
+            { { "contentId", 1 }, { "type", 2 }, { "mimeType", "x/y" }, { "fileName", "../../x" } },
+            { { "messageToneEnabled", QVariant::fromValue(QDBusVariant(true)) } }, { { "bytes", QByteArray(70000, '\0') } },
+            // 21 levels of a{sv} are the deepest that the bus carries.
+            nested(10, 1), nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }),
+            { { "resources", QVariant::fromValue(structure) } }, { { "resources", QVariant::fromValue(intKeys) } },
+            nested(3, QVariant::fromValue(intKeys)) };
+        for (int type : { -1, 0, 1, 2, 3, 4, 5, 6, 7, 8, 99, INT_MIN, INT_MAX }) {
+            for (qlonglong id : { 0LL, -1LL, 1LL, m_sunsetId, file, m_sunsetId + 1000, LLONG_MAX, LLONG_MIN }) {
+                attack("remove", { type, id });
+                for (const QVariantMap &map : maps)
+                    attack("saveAttributes", { type, id, map });
+            }
+        }
+        // Huge and wide maps.
+        QVariantMap huge, wide;
+        for (int i = 0; i < 100000; ++i)
+            huge.insert(QString::number(i), i);
+        for (int i = 0; i < 2000; ++i)
+            wide.insert("key" + QString::number(i), nested(10, i));
+        for (const QVariantList &arguments : { QVariantList { 1, m_sunsetId, huge }, { 0, file, huge }, { 1, m_sunsetId, wide } })
+            attack("saveAttributes", arguments);
+
+        // Wrong arity and types, and names that don't exist, from a seeded generator.
+        const QStringList methods { "createThemelet", "indexFile", "installPackage", "refreshThemelets", "remove", "saveAttributes",
+                                    "setThemelet", "setFavorite", "Remove", "create", "x", "delete", "saveAttributes2", "contentChanged" };
+        const QVariantList values { 1, "s", true, 2.5, qlonglong(7), QVariant::fromValue(uchar(3)), QStringList { "a" },
+                                    QByteArray("ab"), QVariantMap { { "k", 1 } }, QVariantList { 1, "x" },
+                                    QVariant::fromValue(QDBusObjectPath("/p")), QVariant::fromValue(QDBusVariant(5)),
+                                    "file://" + keep, m_sunsetId, -1 };
+        QRandomGenerator random(14);
+        for (int i = 0; i < 600; ++i) {
+            QVariantList arguments;
+            for (int n = random.bounded(5); n > 0; --n)
+                arguments << values.at(random.bounded(values.size()));
+            attack(methods.at(random.bounded(methods.size())), arguments);
+        }
+        for (const char *interface : { "com.vorka.themeletd.Other", "org.freedesktop.DBus.Properties" })
+            attack("Get", { "com.vorka.themeletd", "x" }, interface);
+
+        QCOMPARE(Service::call("setFavorite", { "file://" + m_package + "/images/sunset.jpg", false }).arguments(), QVariantList { true });
+        Service::call("saveAttributes", { 1, m_sunsetId, map({ { "displayName", "Still here" } }) });
+        QTRY_COMPARE(query("SELECT displayName FROM file WHERE id = " + QString::number(m_sunsetId)), QString("Still here"));
+        QCOMPARE(query("PRAGMA integrity_check"), QString("ok"));
+        QCOMPARE(snapshot(), before);
     }
 
     // A second instance leaves the index alone; a usage error is status 2, one line and a hint, as in themeletctl.
