@@ -12,7 +12,6 @@
 #include <QDBusObjectPath>
 #include <QDBusVariant>
 #include <QPainter>
-#include <QRandomGenerator>
 
 #include <memory>
 #include <sys/stat.h>
@@ -107,13 +106,7 @@ private slots:
         m_sunsetId = query("SELECT id FROM file WHERE fileName = 'sunset.themelet'").toLongLong();
     }
 
-    void cleanupTestCase()
-    {
-        // The service may have been restarted by activation, away from m_service.
-        if (const qint64 pid = Service::ownerPid())
-            ::kill(pid_t(pid), SIGTERM);
-        QVERIFY(QTest::qWaitFor([]() { return Service::ownerPid() == 0; }, 20000));
-    }
+    void cleanupTestCase() { QVERIFY(Service::stop(m_service)); }
 
     // Each call changes rows and is announced by one contentChanged of its type (or more, from the loops);
     // a write that changes nothing is not announced (type -1).
@@ -388,19 +381,11 @@ private slots:
         for (const QVariantList &arguments : { QVariantList { 1, m_sunsetId, huge }, { 0, file, huge }, { 1, m_sunsetId, wide } })
             attack("saveAttributes", arguments);
 
-        // Wrong arity and types, and names that don't exist, from a seeded generator.
-        const QStringList methods { "createThemelet", "indexFile", "installPackage", "refreshThemelets", "remove", "saveAttributes",
-                                    "setThemelet", "setFavorite", "Remove", "create", "x", "delete", "saveAttributes2", "contentChanged" };
-        const QVariantList values { 1, "s", true, 2.5, qlonglong(7), QVariant::fromValue(uchar(3)), QStringList { "a" },
-                                    QByteArray("ab"), QVariantMap { { "k", 1 } }, QVariantList { 1, "x" },
-                                    QVariant::fromValue(QDBusObjectPath("/p")), QVariant::fromValue(QDBusVariant(5)),
-                                    "file://" + keep, m_sunsetId, -1 };
-        QRandomGenerator random(14);
-        for (int i = 0; i < 600; ++i) {
-            QVariantList arguments;
-            for (int n = random.bounded(5); n > 0; --n)
-                arguments << values.at(random.bounded(values.size()));
-            attack(methods.at(random.bounded(methods.size())), arguments);
+        // Wrong arity and types, and names that don't exist: the bus layer refuses them before any method runs.
+        for (const QVariantList &arguments : { QVariantList {}, { 1 }, { "s", 2.5 }, { 1, m_sunsetId, QVariantList { 1, "x" } },
+                                               { QVariant::fromValue(QDBusObjectPath("/p")) }, { QVariant::fromValue(QDBusVariant(5)) } }) {
+            for (const char *method : { "createThemelet", "refreshThemelets", "remove", "saveAttributes", "setFavorite", "x", "contentChanged" })
+                attack(method, arguments);
         }
         for (const char *interface : { "com.vorka.themeletd.Other", "org.freedesktop.DBus.Properties" })
             attack("Get", { "com.vorka.themeletd", "x" }, interface);
@@ -443,18 +428,12 @@ private slots:
         m_db = std::make_unique<TestDatabase>();
         QCOMPARE(query("PRAGMA integrity_check"), QString("ok"));
 
-        // While it is down the disk changes; the service comes back by activation.
+        // While it is down the disk changes.
         QVERIFY(QFile::remove(m_watched + "/new.jpg") && writeJpeg(m_watched + "/later.jpg"));
         const QString applied = DConfTest::read(volume);
         DConfTest::write(volume, "99");
         DConfTest::write(colour, "'#ff123456'");
-        const QString services = qEnvironmentVariable("XDG_DATA_HOME") + "/dbus-1/services";
-        QVERIFY(QDir().mkpath(services));
-        QVERIFY(QFile::copy(THEMELETD_SHARE "/dbus-1/services/com.vorka.themeletd.service", services + "/com.vorka.themeletd.service"));
-        const QDBusMessage reload = QDBusMessage::createMethodCall("org.freedesktop.DBus", "/org/freedesktop/DBus",
-                                                                   "org.freedesktop.DBus", "ReloadConfig");
-        QCOMPARE(QDBusConnection::sessionBus().call(reload).type(), QDBusMessage::ReplyMessage);
-        QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
+        QVERIFY(Service::start(m_service, { m_watched, Sysroot::path("/usr/share") }));
         QTRY_COMPARE_WITH_TIMEOUT(query("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
                                         + "') ORDER BY fileName"), QString("later.jpg;notes.themelet"), 20000);
         QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'"), QString("64"), 20000);
