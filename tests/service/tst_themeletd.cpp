@@ -302,7 +302,6 @@ private slots:
         const int type = arguments.value(0).toInt();
         if ((method == "saveAttributes" || method == "remove") && type >= 0 && type <= 4 && type != 3)
             QTRY_VERIFY(m_signals.contains(type));
-        QCOMPARE(Service::call("Ping", {}, 30000, "org.freedesktop.DBus.Peer").type(), QDBusMessage::ReplyMessage);
     }
 
     // Wrong types and arity, unknown methods, ids and types, URLs that are no local files or lead elsewhere, huge or
@@ -436,7 +435,6 @@ private slots:
         QVERIFY(Service::start(m_service, { m_watched, Sysroot::path("/usr/share") }));
         QTRY_COMPARE_WITH_TIMEOUT(query("SELECT fileName FROM file WHERE directoryId = (SELECT id FROM directory WHERE path = '" + m_watched
                                         + "') ORDER BY fileName"), QString("later.jpg;notes.themelet"), 20000);
-        QTRY_COMPARE_WITH_TIMEOUT(query("SELECT width FROM image JOIN file ON id = fileId WHERE fileName = 'later.jpg'"), QString("64"), 20000);
         // The device follows the active themelet again.
         QCOMPARE(DConfTest::read(volume), applied);
         QCOMPARE(DConfTest::read(colour), QString());
