@@ -389,7 +389,6 @@ private slots:
         for (const char *interface : { "com.vorka.themeletd.Other", "org.freedesktop.DBus.Properties" })
             attack("Get", { "com.vorka.themeletd", "x" }, interface);
 
-        QCOMPARE(Service::call("setFavorite", { "file://" + m_package + "/images/sunset.jpg", false }).arguments(), QVariantList { true });
         Service::call("saveAttributes", { 1, m_sunsetId, map({ { "displayName", "Still here" } }) });
         QTRY_COMPARE(query("SELECT displayName FROM file WHERE id = " + QString::number(m_sunsetId)), QString("Still here"));
         QCOMPARE(query("PRAGMA integrity_check"), QString("ok"));
