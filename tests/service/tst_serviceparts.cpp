@@ -20,7 +20,6 @@ private slots:
         QTest::addColumn<int>("notices");
         QTest::addColumn<int>("spacing");
         QTest::addColumn<int>("stall"); // ms the loop is blocked after the second notice
-        QTest::newRow("two apart") << QList<int> { 0 } << 2 << 250 << 0;
         QTest::newRow("burst") << QList<int> { 0 } << 400 << 1 << 0;
         QTest::newRow("two types interleaved") << QList<int> { 0, 2 } << 200 << 2 << 0;
         // A loop that turns late must not bring the next signal closer than the interval.
