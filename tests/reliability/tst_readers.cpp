@@ -74,40 +74,37 @@ struct Checker : QueryAgent::Recipient
 };
 
 // A client process: four threads query until the stop file appears. Prints
-// its queries, failed queries, wrong results and slowest query in ms.
+// its queries, failed queries and wrong results.
 int readerMain(const QString &stopFile, const QString &root)
 {
     [[maybe_unused]] const int niceness = ::nice(10);
     QMutex mutex;
-    int totals[4] = {};
+    int totals[3] = {};
     std::vector<std::unique_ptr<QThread>> threads;
     for (int t = 0; t < ReaderThreads; ++t) {
         threads.emplace_back(QThread::create([&, t]() {
-            int queries = 0, failures = 0, problems = 0, slowest = 0;
+            int queries = 0, failures = 0, problems = 0;
             ThemeletQueryAgent::ThemeletParameters themelets;
             FileQueryAgent::FileParameters files;
             for (; queries < 3 || !QFile::exists(stopFile); ++queries) { // each type at least once
                 const int type = (queries + t) % 3; // threads start on different types
                 Checker checker(type, root + '/');
-                QElapsedTimer timer;
-                timer.start();
                 QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::Type(type));
                 const bool ok = agent && agent->query(&checker, type == ThemeletContent::Themelet
                                         ? static_cast<const QueryAgent::Parameters &>(themelets) : files) && checker.calls;
-                slowest = qMax(slowest, int(timer.elapsed()));
                 failures += !ok;
                 const QString problem = ok ? checker.result() : QString();
                 if (!problem.isEmpty() && ++problems <= 5)
                     qWarning("wrong result: %s", qPrintable(problem));
             }
             QMutexLocker locker(&mutex);
-            totals[0] += queries, totals[1] += failures, totals[2] += problems, totals[3] = qMax(totals[3], slowest);
+            totals[0] += queries, totals[1] += failures, totals[2] += problems;
         }));
         threads.back()->start();
     }
     for (auto &thread : threads)
         thread->wait();
-    std::printf("%d %d %d %d\n", totals[0], totals[1], totals[2], totals[3]);
+    std::printf("%d %d %d\n", totals[0], totals[1], totals[2]);
     return 0;
 }
 
@@ -177,21 +174,21 @@ private slots:
             QTest::qSleep(10);
         }
         QFile(stopFile).open(QIODevice::WriteOnly);
-        int totals[4] = {};
+        int totals[3] = {};
         for (auto &client : clients) {
-            // A client that hung, crashed or failed a sanitizer leaves no line of four numbers.
+            // A client that hung, crashed or failed a sanitizer leaves no line of three numbers.
             QVERIFY(client->waitForFinished(120000) && client->exitStatus() == QProcess::NormalExit && client->exitCode() == 0);
             const QStringList numbers = QString::fromUtf8(client->readAllStandardOutput()).trimmed().split(' ');
-            QCOMPARE(numbers.size(), 4);
-            for (int i = 0; i < 4; ++i)
-                totals[i] = i < 3 ? totals[i] + numbers.at(i).toInt() : qMax(totals[i], numbers.at(i).toInt());
+            QCOMPARE(numbers.size(), 3);
+            for (int i = 0; i < 3; ++i)
+                totals[i] += numbers.at(i).toInt();
         }
         QVERIFY(Service::stop(m_service));
         std::sort(samples.begin(), samples.end());
         qInfo("%d files indexed in %lld ms; loop round trip max %d ms, p99 %d ms over %d calls; -wal %lld KiB when done, "
               "%lld KiB %lld ms later", m_files, doneAt, samples.last(), samples.at(samples.size() * 99 / 100), int(samples.size()),
               walEnd / 1024, wal / 1024, timer.elapsed() - doneAt);
-        qInfo("readers: %d queries, %d failed, %d wrong, slowest %d ms", totals[0], totals[1], totals[2], totals[3]);
+        qInfo("readers: %d queries, %d failed, %d wrong", totals[0], totals[1], totals[2]);
         QVERIFY(wal <= MaxLogSize);
         // A writer waiting on a reader's lock would stall for the busy timeout, 5 s.
         QVERIFY2(samples.last() < 4500, qPrintable(QString::number(samples.last())));
