@@ -2,8 +2,7 @@
 // SPDX-License-Identifier: LGPL-2.1-or-later
 
 // Writes the content that the QML tests list, and its index, as the service would,
-// in another process than the client: themelets, tones and photos, or with
-// "photo NAME" one more photo in the watched directory.
+// in another process than the client: themelets, tones and photos.
 #include "indexfixture.h"
 #include "sysroot.h"
 
@@ -60,20 +59,9 @@ bool writeContent()
 int main(int argc, char **argv)
 {
     QGuiApplication app(argc, argv);
-    const QStringList arguments = app.arguments().mid(1);
-
     DbManager::instance();
     FileManager *files = FileManager::instance();
-    if (!files)
-        return 1;
-    if (arguments.value(0) == QLatin1String("photo")) {
-        if (!writePhoto(arguments.value(1), 5))
-            return 1;
-        files->appendDirectory(pictures(), FileManager::UserScope, FileManager::ScanAlways);
-        return waitIdle() ? 0 : 1;
-    }
-
-    if (!writeContent())
+    if (!files || !writeContent())
         return 1;
     for (const QString &path : InstallManager::installPaths())
         installer()->appendDirectory(path);

@@ -20,7 +20,6 @@ TestCase {
             property color highlightColor
             property bool favorite
             property string notARole: "kept"
-            readonly property int typeSeen: contentType
             // A map-valued role, two levels deep.
             readonly property QtObject resources: QtObject {
                 readonly property QtObject ringerToneFile: QtObject {
@@ -103,7 +102,5 @@ TestCase {
         verify(Fixture.emitContentChanged(1))
         wait(200)
         compare(info.contentId, 0)
-        info.contentType = ContentInfo.Photo
-        compare(info.typeSeen, ContentInfo.Photo)
     }
 }

@@ -43,14 +43,11 @@ TestCase {
     function test_writesThrough() {
         var profile = created({ profile: Profile.Silent })
         profile.ringerToneFile = "/sounds/new.ogg"
-        profile.clockAlarmToneEnabled = true
         profile.ringerVolume = 20
         tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "'/sounds/new.ogg'" })
-        compare(Fixture.dconf(["read", profiles + "silent/clock.alert.enabled"]), "true")
         compare(Fixture.dconf(["read", profiles + "silent/ringing.alert.volume"]), "20")
         profile.clearTone(Profile.RingerTone)
         tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "" })
-        compare(Fixture.dconf(["read", profiles + "silent/ringing.alert.volume"]), "20")
     }
 
     function test_activeProfile() {
