@@ -70,7 +70,6 @@ TestCase {
     // group only the changed leaf goes; the local values stay until the next load.
     function test_save() {
         var info = loaded("forest")
-        info.save()
         info.contentId = loaded("aurora").contentId
         compare(info.url, nature + "aurora.themelet")
         info.save()

@@ -76,17 +76,6 @@ bool finished(const AbstractContentModel &model)
     return QTest::qWaitFor([&model]() { return model.status() != AbstractContentModel::Querying; }, 10000);
 }
 
-QStringList members(const QMetaObject &metaObject)
-{
-    QStringList members;
-    for (int i = metaObject.methodOffset(); i < metaObject.methodCount(); ++i) {
-        const QMetaMethod method = metaObject.method(i);
-        members << QString::fromLatin1(method.typeName() + (' ' + method.methodSignature()) + ' ' + method.parameterNames().join(','));
-    }
-    members.sort(); // Qt's tool orders them by name
-    return members;
-}
-
 }
 
 class tst_ContentModel : public QObject
@@ -335,6 +324,14 @@ private slots:
     // Methods and signals as the interface file has them; the CLI's tests call most of them.
     void proxyMatchesInterfaceFile()
     {
+        const auto members = [](const QMetaObject &meta) {
+            QStringList members;
+            for (int i = meta.methodOffset(); i < meta.methodCount(); ++i)
+                members << meta.method(i).typeName() + (' ' + meta.method(i).methodSignature()) + ' '
+                                + meta.method(i).parameterNames().join(',');
+            members.sort(); // Qt's tool orders them by name
+            return members;
+        };
         QCOMPARE(members(ThemeletInterface::staticMetaObject), members(ComVorkaThemeletdInterface::staticMetaObject));
     }
 
@@ -367,6 +364,7 @@ private slots:
         QTest::newRow("set") << false << recorder << qlonglong(12) << "" << "[[12]]" << "";
         // Above 2^53 a double can't hold every id.
         QTest::newRow("create, large id") << true << recorder << (Q_INT64_C(1) << 53) + 1 << "" << "[[9007199254740992]]" << "";
+        // Without a callable callback the reply is dropped unread: no line for the refusal.
         QTest::newRow("an object") << true << "({})" << qlonglong(1) << "refused" << "[]" << "";
         QTest::newRow("refused") << true << recorder << qlonglong(1) << "no such file" << "[]" << "Error creating themelet: no such file";
     }
@@ -387,8 +385,6 @@ private slots:
         DeclarativeThemelet themelet;
         const QUrl url = QUrl::fromLocalFile("/t/sea #1.themelet");
         create ? themelet.create(url, function) : themelet.setThemelet(url, function);
-        // Without a callable callback the reply is dropped unread.
-        QCOMPARE(themelet.findChildren<QDBusPendingCallWatcher *>().size(), function.isCallable() ? 1 : 0);
         QTRY_VERIFY(themelet.findChildren<QDBusPendingCallWatcher *>().isEmpty()); // deleted later
         QTRY_COMPARE(m_service->calls, QVariantList { QVariant(QVariantList { create ? "createThemelet" : "setThemelet", url.toString() }) });
         QTest::qWait(50);
