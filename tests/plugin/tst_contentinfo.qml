@@ -37,14 +37,8 @@ TestCase {
         verify(Fixture.startService())
     }
 
-    function init() {
-        Fixture.takeCalls()
-    }
-
     function loaded(name) {
-        var info = createTemporaryObject(themeletInfo, test, { url: nature + name + ".themelet" })
-        verify(info.contentId !== 0)
-        return info
+        return createTemporaryObject(themeletInfo, test, { url: nature + name + ".themelet" })
     }
 
     function test_loadByUrl() {

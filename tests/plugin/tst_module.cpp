@@ -53,7 +53,6 @@ private slots:
     void importTouchesNoBus()
     {
         QStringList errors;
-        QVERIFY(create("QtObject {}", &errors));
         QVERIFY(create("Profile {}", &errors));
         QCOMPARE(errors, QStringList());
         QVERIFY(!sessionBusOpen());
