@@ -148,7 +148,6 @@ private slots:
         QVERIFY(requery());
         QCOMPARE(log.filter(QRegularExpression("^(insert|remove)")), QStringList({ "remove 20 20", "insert 30 30" }));
         QCOMPARE(model.index(10, 0).data(FileData::CategoryRole).toString(), "Ringtone");
-        QCOMPARE(model.count(), 120);
 
         // No rows at all: one removal.
         m_db->exec("DELETE FROM directory");
@@ -242,13 +241,12 @@ private slots:
         model.set(1, m_engine.evaluate("({ displayName: 'x' })"));
         model.remove(1);
         QCOMPARE(m_service->take(), QVariantList());
-        QCOMPARE(changed.count(), 1);
 
         // One set is one call and one signal; a nested map sends only the keys given,
         // and the row holds the merged whole.
         model.set(0, m_engine.evaluate("({ displayName: 'Bay', nope: 2,"
                                      "  resources: { ringerTone: { displayName: 'Bell 2' }, messageTone: { url: 'file:///m.ogg' } } })"));
-        QCOMPARE(changed.count(), 2);
+        QCOMPARE(changed.count(), 2); // none from the writes that went nowhere
         QCOMPARE(changed.at(1).at(2).value<QVector<int>>(), QVector<int>({ ThemeletData::DisplayNameRole, ThemeletData::ResourcesRole }));
         const QVariantMap sent { { "ringerTone", QVariantMap { { "displayName", "Bell 2" } } },
                                  { "messageTone", QVariantMap { { "url", "file:///m.ogg" } } } };
