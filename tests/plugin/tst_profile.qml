@@ -19,16 +19,7 @@ TestCase {
         Fixture.dconf(["reset", "-f", "/org/orbaline/themelet/"])
     }
 
-    // Values written by another process, at creation and by a notice; which notices an
-    // object hears is tst_profilemanager's.
-    function test_readsAnotherProcess() {
-        Fixture.dconf(["write", profiles + "general/ringing.alert.tone", "'/sounds/ring.ogg'"])
-        var profile = createTemporaryObject(profileComponent, test)
-        compare([profile.profile, profile.ringerToneFile], [Profile.General, "/sounds/ring.ogg"])
-        Fixture.dconf(["write", profiles + "general/ringing.alert.volume", "40"])
-        tryCompare(profile, "ringerVolume", 40)
-    }
-
+    // Reads and notices of values that another process writes are tst_profilemanager's.
     function test_writesThrough() {
         var profile = createTemporaryObject(profileComponent, test, { profile: Profile.Silent })
         profile.ringerToneFile = "/sounds/new.ogg"
