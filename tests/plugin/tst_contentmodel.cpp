@@ -9,12 +9,10 @@
 #include "messagelog.h"
 #include "recordingservice.h"
 #include "testdatabase.h"
-#include "themeletdproxy.h" // generated from the interface file
 #include "themeletinterface.h"
 #include "themeletmodel.h"
 
 #include <QDBusPendingCallWatcher>
-#include <QMetaMethod>
 #include <QQmlEngine>
 #include <QThreadPool>
 #include <QtTest>
@@ -315,20 +313,6 @@ private slots:
         QCOMPARE(model.count(), 0); // the handler ran
         model.setFiltered(false);
         QCOMPARE(displayNames(model).join(' '), "n0000 n0001 n0002 n0004 n0005 n0005a n0006 n0007 n0007a n0008 n0009");
-    }
-
-    // Methods and signals as the interface file has them; the CLI's tests call most of them.
-    void proxyMatchesInterfaceFile()
-    {
-        const auto members = [](const QMetaObject &meta) {
-            QStringList members;
-            for (int i = meta.methodOffset(); i < meta.methodCount(); ++i)
-                members << meta.method(i).typeName() + (' ' + meta.method(i).methodSignature()) + ' '
-                                + meta.method(i).parameterNames().join(',');
-            members.sort(); // Qt's tool orders them by name
-            return members;
-        };
-        QCOMPARE(members(ThemeletInterface::staticMetaObject), members(ComVorkaThemeletdInterface::staticMetaObject));
     }
 
     // Values in their D-Bus form, and nothing that would make libdbus abort.
