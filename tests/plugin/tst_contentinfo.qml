@@ -63,7 +63,7 @@ TestCase {
     // A load writes every bound property; none of that is a change to save. Of a nested
     // group only the changed leaf goes; the local values stay until the next load.
     function test_save() {
-        var info = loaded("forest")
+        var info = loaded("ocean")
         info.contentId = loaded("aurora").contentId
         compare(info.url, nature + "aurora.themelet")
         info.save()
