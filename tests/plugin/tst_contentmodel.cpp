@@ -189,13 +189,12 @@ private slots:
         QRandomGenerator random(7);
         int midQuery = 0;
         for (int round = 0; round < 200; ++round) {
-            auto *model = new FileModel;
-            model->requery();
-            model->componentComplete();
+            FileModel model;
+            model.requery();
+            model.componentComplete();
             for (int i = random.bounded(4); i > 0; --i)
                 QCoreApplication::processEvents();
-            midQuery += model->status() == AbstractContentModel::Querying;
-            delete model;
+            midQuery += model.status() == AbstractContentModel::Querying;
         }
         QVERIFY(midQuery > 100);
         // 200 queries of 2000 rows run to their end, slowly in a sanitizer build.
