@@ -18,7 +18,6 @@ TestCase {
             contentType: ContentInfo.Themelet
             property string displayName
             property color highlightColor
-            property bool favorite
             property string notARole: "kept"
             // A map-valued role, two levels deep.
             readonly property QtObject resources: QtObject {
@@ -46,7 +45,7 @@ TestCase {
         changedSpy.target = info
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
-        compare([info.displayName, info.highlightColor, info.favorite, info.notARole], ["Aurora", "#ffcc66", true, "kept"])
+        compare([info.displayName, info.highlightColor, info.notARole], ["Aurora", "#ffcc66", "kept"])
         compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
         compare(String(info.resources.ringerToneFile.url), nature + "sounds/dusk.ogg")
 
