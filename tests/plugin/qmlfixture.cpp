@@ -2,8 +2,7 @@
 // SPDX-License-Identifier: LGPL-2.1-or-later
 
 // Writes the content that the QML tests list, and its index, as the service would,
-// in another process than the client: themelets, tones and photos, or with
-// "photo NAME" one more photo in the watched directory.
+// in another process than the client: themelets, tones and photos.
 #include "indexfixture.h"
 #include "sysroot.h"
 
@@ -34,21 +33,19 @@ QByteArray themelet(const QString &name, int day, const QString &tone = QString(
 
 bool writeContent()
 {
-    // Favourites come first, each group by time; Ocean is made a non-favourite below.
+    // Favourites come first, each group by time; Ocean, the earlier, is made a non-favourite below.
     const QString package = Sysroot::path(QStringLiteral("/usr/share/themelet/nature"));
-    if (!writeTree(package, { "images/aurora.jpg", "images/forest.jpg", "images/ocean.jpg", "sounds/dusk.ogg" }, "x")
+    if (!writeTree(package, { "images/aurora.jpg", "images/ocean.jpg", "sounds/dusk.ogg" }, "x")
             || !write(package + "/aurora.themelet", themelet("Aurora", 2, "dusk.ogg"))
-            || !write(package + "/forest.themelet", themelet("Forest", 1))
-            || !write(package + "/ocean.themelet", themelet("Ocean", 3)))
+            || !write(package + "/ocean.themelet", themelet("Ocean", 1)))
         return false;
 
     // An index describes the directory of its own name.
     const QString tones = Sysroot::path(QStringLiteral("/usr/share/sounds/pack/tones"));
     const QByteArray index = R"({"files": [{"fileName": "alarm.ogg", "displayName": "Alarm", "category": "Default"},)"
-                             R"( {"fileName": "beep.ogg", "displayName": "Beep", "category": "Other"},)"
                              R"( {"fileName": "custom.ogg", "displayName": "Custom", "category": "Customer"},)"
                              R"( {"fileName": "ring.ogg", "displayName": "Ring", "category": "Ringtone"}]})";
-    if (!writeTree(tones, { "alarm.ogg", "beep.ogg", "custom.ogg", "ring.ogg" }, "x") || !write(tones + ".index", index))
+    if (!writeTree(tones, { "alarm.ogg", "custom.ogg", "ring.ogg" }, "x") || !write(tones + ".index", index))
         return false;
 
     return QDir().mkpath(pictures()) && writePhoto("b.jpg", 1) && writePhoto("ab.jpg", 2) && writePhoto("a.jpg", 3)
@@ -60,20 +57,9 @@ bool writeContent()
 int main(int argc, char **argv)
 {
     QGuiApplication app(argc, argv);
-    const QStringList arguments = app.arguments().mid(1);
-
     DbManager::instance();
     FileManager *files = FileManager::instance();
-    if (!files)
-        return 1;
-    if (arguments.value(0) == QLatin1String("photo")) {
-        if (!writePhoto(arguments.value(1), 5))
-            return 1;
-        files->appendDirectory(pictures(), FileManager::UserScope, FileManager::ScanAlways);
-        return waitIdle() ? 0 : 1;
-    }
-
-    if (!writeContent())
+    if (!files || !writeContent())
         return 1;
     for (const QString &path : InstallManager::installPaths())
         installer()->appendDirectory(path);

@@ -6,8 +6,7 @@
 # file. Every QML warning counts as a failure.
 #   qmltest.sh <fixture> <qmltestrunner> <tst_file.qml>
 set -u
-export THEMELET_QML_FIXTURE=$1
-"$THEMELET_QML_FIXTURE" || { echo "FAIL: the fixture could not write the index"; exit 1; }
+"$1" || { echo "FAIL: the fixture could not write the index"; exit 1; }
 log="$THEMELET_SANDBOX/qmltest.txt"
 "$2" -input "$3" -o "$log,txt" -o -,txt
 status=$?

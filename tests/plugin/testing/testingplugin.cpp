@@ -8,8 +8,7 @@
 #include <QtQml>
 
 // What a QML test needs from outside its engine: the sandbox's path, the dconf tool as
-// another process, the program that writes the index (qmlfixture), and the recording
-// stand-in for themeletd, which starts only when asked.
+// another process, and the recording stand-in for themeletd, which starts only when asked.
 class Fixture : public QObject
 {
     Q_OBJECT
@@ -17,8 +16,15 @@ class Fixture : public QObject
 public:
     QString sandbox() const { return qEnvironmentVariable("THEMELET_SANDBOX"); }
     // The tool's output, trimmed; a failure is a warning, which fails the test.
-    Q_INVOKABLE QString dconf(const QStringList &arguments) const { return run(QStringLiteral("dconf"), arguments).second; }
-    Q_INVOKABLE bool index(const QStringList &arguments) const { return run(qEnvironmentVariable("THEMELET_QML_FIXTURE"), arguments).first; }
+    Q_INVOKABLE QString dconf(const QStringList &arguments) const
+    {
+        QProcess process;
+        process.setProcessChannelMode(QProcess::ForwardedErrorChannel);
+        process.start(QStringLiteral("dconf"), arguments);
+        if (!process.waitForFinished(120000) || process.exitStatus() != QProcess::NormalExit || process.exitCode() != 0)
+            qWarning() << "dconf" << arguments << "failed";
+        return QString::fromUtf8(process.readAllStandardOutput()).trimmed();
+    }
 
     Q_INVOKABLE bool startService() { return m_service.start(); }
     Q_INVOKABLE bool emitContentChanged(int type) { return m_service.emitContentChanged(type); }
@@ -26,17 +32,6 @@ public:
     Q_INVOKABLE QVariantList takeCalls(int count = 0) { return m_service.take(count); }
 
 private:
-    static std::pair<bool, QString> run(const QString &program, const QStringList &arguments)
-    {
-        QProcess process;
-        process.setProcessChannelMode(QProcess::ForwardedErrorChannel);
-        process.start(program, arguments);
-        const bool ok = process.waitForFinished(120000) && process.exitStatus() == QProcess::NormalExit && process.exitCode() == 0;
-        if (!ok)
-            qWarning() << program << arguments << "failed";
-        return { ok, QString::fromUtf8(process.readAllStandardOutput()).trimmed() };
-    }
-
     RecordingService m_service;
 };
 
