@@ -3,12 +3,11 @@
 
 #include "indexfixture.h"
 
-#include <QCryptographicHash>
 #include <QDirIterator>
 
 using namespace Fixture;
 
-// The sample content that scripts/run shows: generated twice into the sandbox's
+// The sample content that scripts/run shows: generated into the sandbox's
 // sysroot, then read by the engine as the service reads it. Every file the
 // generator makes must be accounted for in the index.
 class tst_SampleContent : public QObject
@@ -26,33 +25,12 @@ class tst_SampleContent : public QObject
         return process.waitForFinished(900000) && process.exitStatus() == QProcess::NormalExit && process.exitCode() == 0;
     }
 
-    // Path, modification time and checksum of every file below root.
-    static QStringList snapshot(const QString &root)
-    {
-        QStringList entries;
-        for (QDirIterator it(root, QDir::Files | QDir::Hidden | QDir::System, QDirIterator::Subdirectories); it.hasNext();) {
-            QFile file(it.next());
-            entries << QStringLiteral("%1 %2 %3").arg(file.fileName().mid(root.size()), QString::number(QFileInfo(file).lastModified().toMSecsSinceEpoch()),
-                                                       file.open(QIODevice::ReadOnly) ? QCryptographicHash::hash(file.readAll(), QCryptographicHash::Md5).toHex() : "unreadable");
-        }
-        entries.sort();
-        return entries;
-    }
-
     QString rows(const QString &statement) { return m_db.rows(statement).join(';'); }
 
 private slots:
-    void idempotent()
-    {
-        QVERIFY(!m_root.isEmpty() && generate(m_root));
-        const QStringList first = snapshot(m_root);
-        QVERIFY(first.size() > 60);
-        QVERIFY(generate(m_root));
-        QCOMPARE(snapshot(m_root), first);
-    }
-
     void indexed()
     {
+        QVERIFY(!m_root.isEmpty() && generate(m_root));
         // What the service does at its start with --watch on the Pictures.
         for (const QString &path : InstallManager::installPaths())
             installer()->appendDirectory(path);
