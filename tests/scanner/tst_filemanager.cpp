@@ -266,23 +266,6 @@ private slots:
         for (const QString &row : rows)
             QCOMPARE(row, row.section('|', 0, 0) + '|' + database.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
     }
-
-    // A new directory and a picture in one read: the next loop step scans the directory, a later one reads the picture.
-    void roadOfChange()
-    {
-        const QString pictures = uniquePath();
-        FileManager *manager = FileManager::instance();
-        QVERIFY(QDir().mkpath(pictures) && manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0);
-        QVERIFY(waitIdle() && write(pictures + "/new/a") && writeJpeg(pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
-        SignalRecorder::clear();
-        QEvent read(QEvent::SockAct);
-        QCoreApplication::sendEvent(manager, &read);
-        QCoreApplication::sendPostedEvents(manager, QEvent::UpdateRequest);
-        QCOMPARE(m_sql.rows("SELECT fileName, metadataCurrent FROM file ORDER BY fileName"), (QStringList { "a|0", "shot.jpg|0" }));
-        QVERIFY(waitIdle());
-        QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 0, 2 }));
-        QCOMPARE(m_sql.rows("SELECT metadataCurrent, width FROM file JOIN image ON fileId = id"), QStringList { "1|64" });
-    }
 };
 
 QTEST_GUILESS_MAIN(tst_FileManager)
