@@ -116,8 +116,6 @@ private slots:
         QTest::newRow("zone changed since the rows") << Case { 0, "touch a", "a", "", "/ a|0", 1, {}, {}, "Asia/Tokyo" };
         // The scope 3 watch reports changes only: no new files.
         QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
-        // Scope 1 doesn't add files.
-        QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
         QStringList many { "/" };
         for (int i = 0; i < 200; ++i)
             many << QString::asprintf("+file-with-a-longer-name-%03d|0", i);
