@@ -131,6 +131,7 @@ private slots:
                                                   QString("/ +") + QChar(0xFEFF) + "c|0", 2 };
         const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
         QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
+        QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
         // The directory's watch and its row go; the IN_IGNORED of the removed watch is passed over.
         QTest::newRow("IN_MOVE_SELF") << Case { 0, tree, treeRows, "mv S ../moved-S", "/ r|1", 4 };
         // Swapped for a link between the event that queues it and its scan.
@@ -250,6 +251,23 @@ private slots:
         QCOMPARE(tree(other), QString("+t.txt|0 /"));
         run(other, "echo x >> t.txt");
         QVERIFY(pendingBytes(manager) > 0);
+    }
+
+    // A new directory and a picture in one read: the next loop step scans the directory, a later one reads the picture.
+    void roadOfChange()
+    {
+        const QString pictures = uniquePath();
+        FileManager *manager = FileManager::instance();
+        QVERIFY(QDir().mkpath(pictures) && manager->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanNew) > 0);
+        QVERIFY(waitIdle() && write(pictures + "/new/a") && writeJpeg(pictures + "/shot.jpg") && pendingBytes(*manager) > 0);
+        SignalRecorder::clear();
+        QEvent read(QEvent::SockAct);
+        QCoreApplication::sendEvent(manager, &read);
+        QCoreApplication::sendPostedEvents(manager, QEvent::UpdateRequest);
+        QCOMPARE(m_sql.rows("SELECT fileName, metadataCurrent FROM file ORDER BY fileName"), (QStringList { "a|0", "shot.jpg|0" }));
+        QVERIFY(waitIdle());
+        QCOMPARE(SignalRecorder::calls(), QList<int>({ 0, 0, 2 }));
+        QCOMPARE(m_sql.rows("SELECT metadataCurrent, width FROM file JOIN image ON fileId = id"), QStringList { "1|64" });
     }
 };
 
