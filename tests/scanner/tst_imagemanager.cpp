@@ -44,10 +44,12 @@ private slots:
         QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("no directory row") << "orphan" << "-1|-1|NULL|NULL" << QStringList();
-        // A failed step leaves its rows stale for the next one: the reset before the failed write is rolled back.
-        QTest::newRow("failed image write") << "INSERT ON image" << "1|1|old|1" << failure("virtual bool ImageManager::updateMetaData()",
-                "Failed to execute m_imageUpdate.", "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) "
-                "VALUES (?, ?, ?, ?, ?);");
+        // A failed step leaves its rows stale for the next one.
+        const char *const function = "virtual bool ImageManager::updateMetaData()";
+        QTest::newRow("failed reset") << "UPDATE ON file" << "1|1|old|1" << failure(function,
+                "Failed to execute m_modifiedReset.", "UPDATE file SET metadataCurrent = 1 WHERE id = ?;");
+        QTest::newRow("failed image write") << "INSERT ON image" << "1|1|old|1" << failure(function, "Failed to execute "
+                "m_imageUpdate.", "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) VALUES (?, ?, ?, ?, ?);");
     }
 
     void step()
