@@ -56,6 +56,7 @@ private slots:
         QTest::addColumn<QVariantList>("values"); // of roles 0..
         const QVariantList values { qint64(7), Tone, "audio/ogg", "tone.ogg", "/m/tone.ogg", "Tone", true, "ringtone" };
         QTest::newRow("file") << Content(record<FileData>(1)) << values;
+        QTest::newRow("photo") << Content(record<PhotoData>(2)) << values.mid(0, 6) + QVariantList { false, "ringtone", QDateTime(), 0, 0, 0 };
         QTest::newRow("themelet") << Content(record<ThemeletData>()) // role 4 is named readOnly, yet gives the local path
                 << QVariantList { qint64(7), Tone, "audio/ogg", "tone.ogg", "/m/tone.ogg", "Tone", true, QUrl::fromLocalFile("/t/home.jpg"),
                                   QUrl(), QColor(Qt::blue), QColor(), QColor(), QColor(), 80, true, false, true, false, true, false,
@@ -69,11 +70,11 @@ private slots:
         const Content content(original.data()->clone()); // so the checks below show that a clone has every field
         QVERIFY(content.data() != original.data() && content == original && content.data()->ref.loadRelaxed() == 1);
         const int type = content.type();
-        QCOMPARE((type == 0 ? FileData::roleNames() : ThemeletData::roleNames()).size(), values.size());
+        QCOMPARE((type == 0 ? FileData::roleNames() : type == 2 ? PhotoData::roleNames() : ThemeletData::roleNames()).size(), values.size());
         for (int role = -1; role <= values.size(); ++role) { // -1 and one past the last give nothing
             QCOMPARE(content.data()->data(role).userType(), values.value(role).userType());
             QCOMPARE(content.data()->data(role), values.value(role));
-            QVERIFY(type == 1 || !content.data()->setData(role, 1)); // files take no edits
+            QVERIFY(type == 1 || !content.data()->setData(role, 1)); // files and photos take no edits
         }
     }
 
