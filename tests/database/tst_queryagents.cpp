@@ -257,8 +257,8 @@ private slots:
         addFile("/p/unread.jpg", "image/jpeg");
         for (int i = 0; i < 60; ++i)
             addFile(QStringLiteral("/p/more/m%1.png").arg(i, 2, 10, QLatin1Char('0')), i % 2 ? "image/png" : "image/jpeg");
-        m_db->exec({ QStringLiteral("INSERT INTO image VALUES (%1, '2014-05-02T00:00:00', 64, 48, 6), (%2, '2014-05-01T00:00:00', 1, 2, 0)")
-                             .arg(late).arg(early),
+        m_db->exec({ QStringLiteral("INSERT INTO image VALUES (%1, '2014-05-02T00:00:00', 64, 48, 6), "
+                                    "(%2, '2014-05-01T00:00:00', 1, 2, 0)").arg(late).arg(early),
                      "INSERT INTO image SELECT id, '2015-01-01T00:00:' || substr(fileName, 2, 2), 'wide', 2.5, x'07' FROM file "
                      "WHERE fileName GLOB 'm*'" });
         PhotoQueryAgent photos(*m_database);
@@ -268,8 +268,8 @@ private slots:
         QCOMPARE(batches.names.mid(0, 3), (QStringList { "early", "late", "m00" }));
         QCOMPARE(roles(batches.all.at(1), 12), QStringLiteral("%1|file:///p/late.jpg|image/jpeg|late.jpg|/p/late.jpg|late|false|"
                                                               "NULL|2014-05-02T00:00:00.000|64|48|6").arg(late).replace("NULL", QString()));
-        QCOMPARE(roles(batches.all.last(), 12).section('|', 1), QStringLiteral("file:///p/more/m59.png|image/png|m59.png|/p/more/m59.png|"
-                                                                              "m59|false||2015-01-01T00:00:59.000|0|3|0"));
+        QCOMPARE(roles(batches.all.last(), 12).section('|', 1),
+                 QString("file:///p/more/m59.png|image/png|m59.png|/p/more/m59.png|m59|false||2015-01-01T00:00:59.000|0|3|0"));
         QCOMPARE(batches.all.at(50).data()->data(2).toString(), QStringLiteral("image/jpeg"));
 
         // The lookups name a table that was never there: each fails with its records, and gives nothing.

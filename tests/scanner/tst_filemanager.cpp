@@ -142,17 +142,19 @@ private slots:
                                                                   { "^Failed to add listener -1 \".*/N\"$" } };
 
         // Stored types are QMimeDatabase's, also where the content decides and for files that aren't regular.
-        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >";
-        QTest::newRow("types: ogg by content") << Case { 0, vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg", "",
-                vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; printf '\\211PNG\\r\\n\\032\\n' > p.ogg", "", 0 };
-        QTest::newRow("types: man pages and other globs") << Case { 0, "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ "
-                "Makefile.am a.anim1", "", "touch d.1 e.so.2 456.vdr", "", 0 };
-        QTest::newRow("types: case") << Case { 0, "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT", "", "touch i.JPG j.jpg k.C", "", 0 };
-        QTest::newRow("types: own and dotted") << Case { 0, "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav",
-                "", "touch f.tar.gz g.themelet h.index", "", 0 };
-        QTest::newRow("types: content unlike the name") << Case { 0, "echo text > a.jpg; printf '\\211PNG\\r\\n\\032\\n' > b.mp3; "
-                "touch c.wav d.pdf", "", "echo text > e.jpg", "", 0 };
-        QTest::newRow("types: not regular files") << Case { 0, "touch t.txt", "", "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg", "", 0 };
+        const auto types = [](const char *tag, const QString &disk, const QString &changes) {
+            QTest::newRow(tag) << Case { 0, disk, "", changes, "", 0 };
+        };
+        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >", png = "printf '\\211PNG\\r\\n\\032\\n' >";
+        types("types: ogg", vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg",
+              vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; " + png + " p.ogg");
+        types("types: globs", "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ Makefile.am a.anim1",
+              "touch d.1 e.so.2 456.vdr");
+        types("types: case", "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT", "touch i.JPG j.jpg k.C");
+        types("types: own and dotted", "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav",
+              "touch f.tar.gz g.themelet h.index");
+        types("types: content unlike the name", "echo text > a.jpg; " + png + " b.mp3; touch c.wav d.pdf", "echo text > e.jpg");
+        types("types: not regular files", "touch t.txt", "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg");
     }
 
     void scanAndEvents()
@@ -245,8 +247,8 @@ private slots:
         const qint64 file = manager.insertFile(other + "/t.txt");
         QVERIFY(file > 0);
         QCOMPARE(manager.insertFile(other + "/t.txt"), file);
-        QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id "
-                            "WHERE path = '" + other + "';"), QStringList { "NULL|1|text/plain|3" });
+        QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id"
+                            " WHERE path = '" + other + "';"), QStringList { "NULL|1|text/plain|3" });
         QVERIFY(waitIdle());
         QCOMPARE(tree(other), QString("+t.txt|0 /"));
         run(other, "echo x >> t.txt");
