@@ -162,7 +162,6 @@ private slots:
         QTest::addColumn<QString>("tail");       // of the statement
         QTest::addColumn<QString>("names");
         const QString byName = " ORDER BY  file.displayName ASC;";
-        QTest::newRow("default") << ";;" << byName << "a b c d e";
         QTest::newRow("exact mime") << "audio/ogg;;" << "WHERE file.mimeType = ?" + byName << "a d";
         QTest::newRow("mime glob") << "audio/*;;" << "WHERE file.mimeType GLOB ?" + byName << "a b d e";
         // "/d" takes in neither /d itself nor /dx.
