@@ -74,7 +74,6 @@ private slots:
                               TestDatabase::errorText("1", "no such column: metadataCurrent") }) + outdated
                 << 12 << "";
         QTest::newRow("0, foreign") << int(Foreign) << 0 << true << here << outdated << 12 << "";
-        QTest::newRow("6") << 7 << 6 << true << here << outdated << 12 << "";
         QTest::newRow("14") << 12 << 14 << true << here << outdated << 12 << "";
         QTest::newRow("not a database") << int(NotADatabase) << 0 << true << here
                 << warnings({ "DbManager::DbManager()", "Failed to query user version",
@@ -180,7 +179,6 @@ private slots:
 
     void triggers()
     {
-        MessageLog log({ Fine });
         QVERIFY(DbManager().isOpen());
         // Directories 1 > 2 > 3 and 4; file n in directory n, file 5 in 4.
         TestDatabase db;

@@ -9,8 +9,9 @@ using namespace Fixture;
 
 namespace {
 
-// Disk, rows under a root of the scope, changes after the scan (read at once; "?": a foreign watch on the parent),
-// the index after them, the signals (one a scan or a read), warnings, names after each scan step, a zone to switch to.
+// Disk, rows under a root of the scope, changes after the scan (read at once; "?": a foreign watch on the parent), the index
+// after them and the signals (one a scan or a read; no index: every file's stored type is QMimeDatabase's, whatever the
+// signals), warnings, names after each scan step, a zone to switch to.
 struct Case
 {
     int scope;
@@ -107,7 +108,6 @@ private slots:
         QTest::newRow("a known root is not adopted") << Case { 0, "mkdir S; touch r", "S/=1", "", "/ S/", 0,
                 failure("bool FileManager::scanDirectory()", "Failed to execute m_directoryInsert.", "INSERT INTO directory") };
 
-        QTest::newRow("move within the directory") << Case { 0, "touch a", "a", "mv a b", "/ +b|0", 2 };
         QTest::newRow("move onto a known file") << Case { 0, "touch a b", "a b", "mv a b", "/ b|0", 2 };
         QTest::newRow("create, delete, create: rolled back") << Case { 0, "", "", "touch f; rm f; touch f", "/", 1,
                 failure("bool FileManager::readEvent()", "Failed to execute m_fileInsert.", "INSERT INTO file") };
@@ -115,11 +115,8 @@ private slots:
         QTest::newRow("move away, create again") << Case { 0, "touch a", "a", "mv a ..; touch a", "/", 2 };
         // Rows written as local times are read in the zone of now: the process follows the change.
         QTest::newRow("zone changed since the rows") << Case { 0, "touch a", "a", "", "/ a|0", 1, {}, {}, "Asia/Tokyo" };
-        QTest::newRow("IN_MODIFY of a known file") << Case { 0, "touch a b", "a b", "echo x >> a", "/ a|0 b|1", 2 };
         // The scope 3 watch reports changes only: no new files.
         QTest::newRow("index scope events") << Case { 3, "touch a", "a", "touch n; echo x >> a", "/ a|0", 2 };
-        // Scope 1 doesn't add files.
-        QTest::newRow("modify a file without a row") << Case { 1, "touch a", "", "echo x >> a", "/", 2 };
         QStringList many { "/" };
         for (int i = 0; i < 200; ++i)
             many << QString::asprintf("+file-with-a-longer-name-%03d|0", i);
@@ -135,13 +132,29 @@ private slots:
         const QString tree = "mkdir S; touch r S/s", treeRows = "r S/ S/s";
         QTest::newRow("directory created") << Case { 0, tree, treeRows, "mkdir N; touch N/n", "/ N/ +N/n|0 S/ S/s|1 r|1", 4 };
         QTest::newRow("IN_DELETE_SELF") << Case { 0, tree, treeRows, "rm -r S", "/ r|1", 3 };
-        QTest::newRow("IN_MOVE_SELF") << Case { 0, tree, treeRows, "mv S ../moved-S", "/ r|1", 4 }; // and the IN_IGNORED of the removed watch
+        // The directory's watch and its row go; the IN_IGNORED of the removed watch is passed over.
+        QTest::newRow("IN_MOVE_SELF") << Case { 0, tree, treeRows, "mv S ../moved-S", "/ r|1", 4 };
         // Swapped for a link between the event that queues it and its scan.
         QTest::newRow("directory now a link") << Case { 0, "mkdir -p ../outside; touch ../outside/secret", "",
                 "mkdir N; rmdir N; ln -s ../outside N", "/ N/ +N|0", 2, { "^Skipping a directory that is a symbolic link \".*/N\"$" } };
         // The failed watch is reported and the scan goes on, finding nothing.
         QTest::newRow("directory gone before its scan") << Case { 0, "", "", "mkdir N; rmdir N", "/ N/", 3,
                                                                   { "^Failed to add listener -1 \".*/N\"$" } };
+
+        // Stored types are QMimeDatabase's, also where the content decides and for files that aren't regular.
+        const auto types = [](const char *tag, const QString &disk, const QString &changes) {
+            QTest::newRow(tag) << Case { 0, disk, "", changes, "", 0 };
+        };
+        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >", png = "printf '\\211PNG\\r\\n\\032\\n' >";
+        types("types: ogg", vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg",
+              vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; " + png + " p.ogg");
+        types("types: globs", "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ Makefile.am a.anim1",
+              "touch d.1 e.so.2 456.vdr");
+        types("types: case", "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT", "touch i.JPG j.jpg k.C");
+        types("types: own and dotted", "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav",
+              "touch f.tar.gz g.themelet h.index");
+        types("types: content unlike the name", "echo text > a.jpg; " + png + " b.mp3; touch c.wav d.pdf", "echo text > e.jpg");
+        types("types: not regular files", "touch t.txt", "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg");
     }
 
     void scanAndEvents()
@@ -170,8 +183,16 @@ private slots:
         QVERIFY(waitIdle());
 
         compareWarnings(log, c.warnings);
-        QCOMPARE(tree(root), sorted(c.after.split(' ')));
-        QCOMPARE(SignalRecorder::calls(), QVector<int>(c.signalCount, 0).toList());
+        if (c.after.isEmpty()) {
+            const QStringList rows = m_sql.rows("SELECT fileName, mimeType FROM file ORDER BY fileName;");
+            QVERIFY(rows.size() > 3);
+            const QMimeDatabase types;
+            for (const QString &row : rows)
+                QCOMPARE(row, row.section('|', 0, 0) + '|' + types.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
+        } else {
+            QCOMPARE(tree(root), sorted(c.after.split(' ')));
+            QCOMPARE(SignalRecorder::calls(), QVector<int>(c.signalCount, 0).toList());
+        }
         if (!c.steps.isEmpty())
             QCOMPARE(names.join(' '), c.steps);
     }
@@ -218,61 +239,20 @@ private slots:
         QCOMPARE(manager.appendDirectory(root, FileManager::InstallScope, FileManager::ScanAlways), id);
         QVERIFY(waitIdle());
         QCOMPARE(tree(root), QString("/ early|1 f|0 late|1"));
-    }
 
-    void insertFile()
-    {
-        const QString root = uniquePath();
-        run(root, "touch t.txt other");
-        FileManager manager(DbManager::instance(), nullptr);
-        QCOMPARE(manager.insertFile(root + "/missing"), 0);
-        const qint64 id = manager.insertFile(root + "/t.txt");
-        QVERIFY(id > 0);
-        QCOMPARE(manager.insertFile(root + "/t.txt"), id);
-
-        // An unknown directory becomes a root of scope 1: scanned in that scope, and watched.
-        QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id;"),
-                 QStringList { "NULL|1|text/plain|3" });
+        // A file's unknown directory becomes a root of scope 1: scanned in that scope, and watched.
+        const QString other = root + "-file";
+        run(other, "touch t.txt other");
+        QCOMPARE(manager.insertFile(other + "/missing"), 0);
+        const qint64 file = manager.insertFile(other + "/t.txt");
+        QVERIFY(file > 0);
+        QCOMPARE(manager.insertFile(other + "/t.txt"), file);
+        QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id"
+                            " WHERE path = '" + other + "';"), QStringList { "NULL|1|text/plain|3" });
         QVERIFY(waitIdle());
-        QCOMPARE(tree(root), QString("+t.txt|0 /"));
-        run(root, "echo x >> t.txt");
+        QCOMPARE(tree(other), QString("+t.txt|0 /"));
+        run(other, "echo x >> t.txt");
         QVERIFY(pendingBytes(manager) > 0);
-    }
-
-    // Stored types are QMimeDatabase's, also where the content decides and for files that aren't regular.
-    void mimeTypes_data()
-    {
-        QTest::addColumn<QString>("disk");
-        QTest::addColumn<QString>("changes");
-        const QString vorbis = "printf 'OggS\\0\\2%022d\\001vorbis' 0 >";
-        QTest::newRow("ogg: vorbis, opus, empty, text, png") << vorbis + " v.ogg; : > e.ogg; echo x > t.ogg; printf 'OggS\\0\\2%022dOpusHead' 0 > o.ogg"
-                                                   << vorbis + " v2.ogg; : > e2.ogg; echo y > t2.ogg; printf '\\211PNG\\r\\n\\032\\n' > p.ogg";
-        QTest::newRow("man pages and other globs") << "touch a.1 b.9 c.0 x.so.1 123.vdr core makefile README.md f~ Makefile.am a.anim1"
-                                                   << "touch d.1 e.so.2 456.vdr";
-        QTest::newRow("no extension") << "echo text > plain; printf '\\211PNG\\r\\n\\032\\n' > png; : > empty" << "echo x > plain2; : > empty2";
-        QTest::newRow("case") << "touch a.jpg B.JPG c.Jpg d.C e.c f.MP3 g.mp3 h.TXT" << "touch i.JPG j.jpg k.C";
-        QTest::newRow("own and dotted types") << "echo x > a.themelet; echo '[x]' > b.index; touch c.tar.gz d.gz e.x.mp3 .h.wav"
-                                              << "touch f.tar.gz g.themelet h.index";
-        QTest::newRow("content unlike the name") << "echo text > a.jpg; printf '\\211PNG\\r\\n\\032\\n' > b.mp3; touch c.wav d.pdf"
-                                                 << "echo text > e.jpg";
-        QTest::newRow("not regular files") << "touch t.txt" << "mkfifo f.txt; ln -s t.txt l.mp3; ln -s gone g.ogg";
-    }
-
-    void mimeTypes()
-    {
-        QFETCH(QString, disk);
-        QFETCH(QString, changes);
-        const QString root = uniquePath();
-        run(root, disk);
-        FileManager manager(DbManager::instance(), nullptr);
-        QVERIFY(manager.appendDirectory(root, FileManager::UserScope, FileManager::ScanNew) > 0 && waitIdle());
-        run(root, changes);
-        QVERIFY(waitIdle());
-        const QStringList rows = m_sql.rows("SELECT fileName, mimeType FROM file ORDER BY fileName;");
-        QVERIFY(rows.size() > 3);
-        const QMimeDatabase database;
-        for (const QString &row : rows)
-            QCOMPARE(row, row.section('|', 0, 0) + '|' + database.mimeTypeForFile(root + '/' + row.section('|', 0, 0)).name());
     }
 
     // A new directory and a picture in one read: the next loop step scans the directory, a later one reads the picture.
