@@ -6,11 +6,9 @@
 #include "profiledefaults.h"
 #include "profilemanager.h"
 
-#include <QRect>
 #include <QtTest>
 
 static const QString s_tree = QStringLiteral("/org/orbaline/themelet/"), s_profiles = s_tree + "profiles/";
-static const QString s_items = QStringLiteral("/org/orbaline/test/items/");
 static const QStringList s_tones { "ringing", "sms", "im", "email", "voip", "calendar", "clock" };
 static QStringList s_calls;
 static char s_active[] = "active", s_change[] = "change", s_current[] = "current";
@@ -64,32 +62,9 @@ private slots:
     void init()
     {
         DConfTest::reset(s_tree);
-        DConfTest::reset(s_items);
         QVERIFY(DConfTest::barrier());
         s_calls.clear();
         QCOMPARE(profile_tracker_init(), 0);
-    }
-
-    // A key-value item, the store's other client. Every change of a key, also the reset of a directory above it,
-    // arrives later as one valueChanged() at every item of the key, also after an item went before its notice.
-    void items()
-    {
-        const QVariant value(5000000000LL);
-        MGConfItem item(s_items + "key"), other(item.key()), unrelated(s_items + "key2");
-        QSignalSpy spy(&item, &MGConfItem::valueChanged), otherSpy(&other, &MGConfItem::valueChanged);
-        QSignalSpy unrelatedSpy(&unrelated, &MGConfItem::valueChanged);
-        std::unique_ptr<MGConfItem>(new MGConfItem(item.key()))->set(value);
-        QCOMPARE(spy.count(), 0);
-        QCOMPARE(DConfTest::read(item.key()), "int64 5000000000");
-        QVERIFY(DConfTest::barrier());
-        QCOMPARE(other.value(), value);
-        // A value the store can't hold is refused, and the stored one kept.
-        QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^bool DConfStore::write\\(.*\\) Unsupported value type QRect"));
-        item.set(QRect(1, 2, 3, 4));
-        QCOMPARE(item.value(), value);
-        DConfTest::reset(s_items);
-        QVERIFY(DConfTest::barrier());
-        QCOMPARE(QString("%1 %2 %3").arg(spy.count()).arg(otherSpy.count()).arg(unrelatedSpy.count()), QString("2 2 1"));
     }
 
     // The first object starts the tracker and the last one stops it.
