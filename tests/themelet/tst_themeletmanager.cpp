@@ -66,44 +66,35 @@ private slots:
         SignalRecorder::clear();
     }
 
-    void translation()
-    {
-        // A path is no catalogue.
-        const QStringList catalogs { "../translations/themelet-sunset", "themelet-gone", "themelet-sunset" };
-        for (int i = 0; i < catalogs.size(); ++i)
-            addThemelet(QString::number(i), QStringLiteral(R"({"wallpaper": "w.jpg", "translationCatalog": "%1", )"
-                    R"("displayName": "themelet-la-sunset"})").arg(catalogs[i]).toUtf8());
-        m_manager->updateMetaData();
-        QCOMPARE(m_db.rows("SELECT displayName FROM file JOIN themelet ON fileId = id ORDER BY id"),
-                 (QStringList { "themelet-la-sunset", "themelet-la-sunset", "Auringonlasku" }));
-    }
-
     void format_data()
     {
         QTest::addColumn<QByteArray>("json");
-        QTest::addColumn<QString>("row"); // favorite|ringerVolume|enabledSounds|version|the four colours|partner|timestamp
+        QTest::addColumn<QString>("row"); // name|favorite|ringerVolume|enabledSounds|version|the four colours|partner|timestamp
         QTest::addColumn<QStringList>("resources");
         const auto add = [](const char *tag, const char *keys, const char *row, const QStringList &resources = {}) {
             QTest::newRow(tag) << "{\"wallpaper\": " + QByteArray(keys) + '}' << QString(row) << resources;
         };
-        const char *defaults = "1|80|-1|1|NULL|NULL|NULL|NULL|NULL|now";
+        const char *defaults = "NULL|1|80|-1|1|NULL|NULL|NULL|NULL|NULL|now";
         add("wallpaper linked out of the package", R"("out.jpg")", "");
-        add("volume 150, not favourite, timestamp normalised, surrogates", R"("w.jpg", "ringerVolume": 150, "favorite": false, )"
+        add("translated, volume 150, not favourite, timestamp normalised, surrogates", R"("w.jpg", "ringerVolume": 150, )"
+            R"("favorite": false, "translationCatalog": "themelet-sunset", "displayName": "themelet-la-sunset", )"
             R"("timestamp": "2014-05-01T12:00:00.250Z", "partnerSpace": "a\ud800b\udc00", "highlightColor": "#112233", )"
             R"("secondaryHighlightColor": "#445566", "primaryColor": "#778899", "secondaryColors": "#80aabbcc")",
-            "0|150|-1|1|#112233|#445566|#778899|#80aabbcc|a\uFFFDb\uFFFD|2014-05-01T12:00:00Z");
+            "Auringonlasku|0|150|-1|1|#112233|#445566|#778899|#80aabbcc|a\uFFFDb\uFFFD|2014-05-01T12:00:00Z");
         // Only the ringer has a fallback tone.
         add("defaults, enabled false is no number, an empty file falls back", R"("w.jpg", "ringerToneFile": {"enabled": 1}, )"
             R"("messageToneFile": {"file": "dusk.ogg", "enabled": false})", defaults,
             { "messageToneFile|dusk.ogg", "ringerToneFile|fallback-ringer.ogg" });
+        // A catalogue is no path.
         add("disabled: an empty file, a kept resource", R"("w.jpg", "ringerToneFile": {"file": "", "enabled": 0}, )"
-            R"("messageToneFile": {"file": "dusk.ogg", "enabled": 0})", "1|80|-4|1|NULL|NULL|NULL|NULL|NULL|now",
+            R"("messageToneFile": {"file": "dusk.ogg", "enabled": 0}, "translationCatalog": "../translations/themelet-sunset", )"
+            R"("displayName": "themelet-la-sunset")", "themelet-la-sunset|1|80|-4|1|NULL|NULL|NULL|NULL|NULL|now",
             { "messageToneFile|dusk.ogg" });
         add("tone files .., a directory, a link out", R"("w.jpg", "ringerToneFile": {"file": ".."}, )"
             R"("messageToneFile": {"file": "sounds"}, "mailToneFile": {"file": "out.ogg"})", defaults);
         add("wrong types everywhere", R"("w.jpg", "displayName": 5, "translationCatalog": [], "favorite": "no", )"
             R"("highlightColor": {"a": 1}, "ringerVolume": 60.5, "partnerSpace": 7, "timestamp": "yesterday", "version": "3", )"
-            R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "1|80|-1|0||NULL|NULL|NULL|NULL|now");
+            R"("ringerToneFile": [1], "messageToneFile": {"file": 5, "enabled": "0"})", "NULL|1|80|-1|0||NULL|NULL|NULL|NULL|now");
     }
 
     void format()
@@ -115,8 +106,8 @@ private slots:
         addThemelet("edge", json);
         QCOMPARE(m_manager->updateMetaData(), false);
         QCOMPARE(SignalRecorder::calls(), QList<int> { 1 });
-        QCOMPARE(m_db.rows("SELECT favorite, ringerVolume, enabledSounds, version, highlightColor, secondaryHighlightColor, "
-                           "primaryColor, secondaryColor, partnerSpace, " + timestampSince(since) + " FROM themelet"),
+        QCOMPARE(m_db.rows("SELECT displayName, favorite, ringerVolume, enabledSounds, version, highlightColor, secondaryHighlightColor, "
+                           "primaryColor, secondaryColor, partnerSpace, " + timestampSince(since) + " FROM themelet JOIN file ON fileId = id"),
                  row.isEmpty() ? QStringList() : QStringList { row });
         QCOMPARE(m_db.rows(s_resources), resources);
     }
