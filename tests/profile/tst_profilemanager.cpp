@@ -14,7 +14,6 @@ static QStringList s_calls;
 static char s_active[] = "active", s_change[] = "change", s_current[] = "current";
 
 static QString text(const char *text) { return text ? QString::fromUtf8(text) : QStringLiteral("<null>"); }
-static QString take(char *value) { return text(QScopedPointer<char, QScopedPointerPodDeleter>(value).data()); }
 
 static void recordValue(const char *profile, const char *key, const char *value, const char *type, void *tag)
 {
@@ -207,9 +206,8 @@ private slots:
         QVERIFY(DConfTest::barrier());
         QCOMPARE(s_calls, (QStringList { "change silent ringing.alert.volume 55 integer", "active general ringing.alert.tone " + ring + " string",
                                          "removing", "active general email.alert.tone /x/é.ogg string" }));
-        QCOMPARE(QString("%1|%2|%3").arg(take(profile_get_value("silent", volume))).arg(profile_get_value_as_int("silent", volume))
-                         .arg(profile_get_value_as_bool("silent", volume)), "55|55|1");
-        QCOMPARE(take(profile_get_value("general", "ringing.alert.tone")), ring);
+        QVERIFY(profile_get_value_as_int("silent", volume) == 55 && profile_get_value_as_bool("silent", volume));
+        QCOMPARE(text(QScopedPointer<char, QScopedPointerPodDeleter>(profile_get_value("general", "ringing.alert.tone")).data()), ring);
         s_calls.clear();
         QVERIFY(profile_set_profile("silent") == 0 && DConfTest::barrier());
         QCOMPARE(s_calls, QStringList { "current profile silent" });
