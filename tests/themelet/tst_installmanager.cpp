@@ -14,8 +14,6 @@ class tst_InstallManager : public QObject
     TestDatabase m_db { serviceIndex() };
 
 private slots:
-    void initTestCase() { QVERIFY(installer()); }
-
     void scanMerge()
     {
         // Packages a, b and r on disk; rows b, c, y and z from an earlier run, and r a root of its own, adopted with its id.
@@ -27,34 +25,19 @@ private slots:
                                          "FROM (VALUES ('b'), ('c'), ('y'), ('z'))").arg(parentId, installDir)));
         const QString knownIds = QStringLiteral("SELECT id FROM directory WHERE path IN ('%1/b', '%1/r') ORDER BY path").arg(installDir);
         const QStringList ids = m_db.rows(knownIds);
-        const QString children = QStringLiteral("SELECT substr(path, %1), scope, (SELECT count(*) FROM file WHERE directoryId = "
-                                                "directory.id) FROM directory WHERE parentId = %2 ORDER BY path")
+        const QString children = QStringLiteral("SELECT substr(path, %1), scope, (SELECT group_concat(metadataCurrent) FROM file "
+                                                "WHERE directoryId = directory.id) FROM directory WHERE parentId = %2 ORDER BY path")
                                          .arg(installDir.size() + 2).arg(parentId);
 
-        // New r uses up the list in front of row y, left for the next scan; z, behind it, goes at once. With a second
-        // directory queued: both scans, each package in the order found, then the indexes (one broken) are read.
-        // Also a name that isn't UTF-8 and a package that vanishes while queued.
-        QVERIFY(write(installDir + "-2/s/s.index", "{\"files\": [") && write(installDir + "/v/v.index", "{}"));
+        // New r uses up the list in front of row y, left for the next scan; z, behind it, goes at once. Also a name that
+        // isn't UTF-8 and a package that vanishes while queued.
+        QVERIFY(write(installDir + "/v/v.index", "{}"));
         QVERIFY(::mkdir((QFile::encodeName(installDir) + "/bad\xff\xfe").constData(), 0755) == 0);
-        QTest::ignoreMessage(QtWarningMsg, QRegularExpression("^Error parsing index from file .*/s.index"));
         installer()->appendDirectory(installDir);
-        installer()->appendDirectory(installDir + "-2");
-        QStringList steps;
-        for (int i = 0; i < 20; ++i) {
-            QCoreApplication::sendPostedEvents(installer(), QEvent::UpdateRequest);
-            steps << m_db.value(QStringLiteral("SELECT (SELECT group_concat(substr(path, -1), '') FROM (SELECT path FROM directory WHERE "
-                                               "path LIKE '%1%/_' ORDER BY substr(path, -1))) || ' ' || ifnull((SELECT group_concat("
-                                               "substr(fileName, 1, 1) || metadataCurrent, '') FROM (SELECT * FROM file WHERE fileName LIKE "
-                                               "'_.index' ORDER BY id)), '')").arg(installDir)).toString();
-            steps.removeDuplicates();
-            if (i == 0)
-                QDir(installDir + "/v").removeRecursively();
-        }
-        QVERIFY(waitIdle());
-        QCOMPARE(steps, (QStringList { "abrvy ", "abrsvy ", "abrsvy a0", "abrsvy a0b0", "abrsvy a0b0r0", "abrsvy a0b0r0s0",
-                                       "abrsvy a1b0r0s0", "abrsvy a1b1r0s0", "abrsvy a1b1r1s0", "abrsvy a1b1r1s1" }));
+        QCoreApplication::sendPostedEvents(installer(), QEvent::UpdateRequest);
+        QVERIFY(QDir(installDir + "/v").removeRecursively() && waitIdle());
         // No row for the name that isn't UTF-8; v, gone before its install, goes with the next scan like y.
-        QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1", "v|2|0", "y|2|0" }));
+        QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1", "v|2|NULL", "y|2|NULL" }));
         QCOMPARE(m_db.rows(knownIds), ids);
         QVERIFY(installFrom(installDir));
         QCOMPARE(m_db.rows(children), (QStringList { "a|2|1", "b|2|1", "r|2|1" }));
