@@ -13,7 +13,7 @@
 
 namespace {
 
-enum Setup { NoFile = -1, NotADatabase = -2, Foreign = 0 }; // files not of a schema version
+enum Setup { NoFile = -1, NotADatabase = -2 }; // files not of a schema version
 
 const QString Fine = QStringLiteral("debug: DbManager::DbManager() Themelet DB Fine...");
 
@@ -53,11 +53,11 @@ private slots:
         const QStringList nuke = warnings({ "DbManager::DbManager() Nuking themelet database due previous errors!",
                                             QStringLiteral("Delete:  \"%1\"").arg(m_path) }) << Fine;
         const QStringList outdated = warnings({ "Database version outdated or non-existent" }) + nuke;
-        const QStringList from8 { step(8, 10), written(10), written(11), step(11, 12), written(12), Fine };
 
         QTest::newRow("no file") << int(NoFile) << 0 << true << QString() << QStringList { Fine } << "";
         QTest::newRow("12") << 12 << 12 << true << here << QStringList { Fine } << "1 1 1 1 1";
-        QTest::newRow("7") << 7 << 7 << true << here << QStringList { step(7, 8), written(8) } + from8 << "0 0 1 0 1";
+        QTest::newRow("7") << 7 << 7 << true << here << QStringList { step(7, 8), written(8), step(8, 10), written(10), written(11),
+                                                                    step(11, 12), written(12), Fine } << "0 0 1 0 1";
         QTest::newRow("13") << 12 << 13 << true << here
                 << QStringList { "debug: bool DbManager::dropSchema_v13() Reverting database schema version 13!", written(12), Fine }
                 << "1 1 1 1 1";
@@ -66,7 +66,6 @@ private slots:
                               "\"UPDATE file SET metadataCurrent = 0 WHERE mimeType=\\\"application/x-vorka-index\\\";\"",
                               TestDatabase::errorText("1", "no such column: metadataCurrent") }) + outdated
                 << "";
-        QTest::newRow("0, foreign") << int(Foreign) << 0 << true << here << outdated << "";
         QTest::newRow("14") << 12 << 14 << true << here << outdated << "";
         QTest::newRow("not a database") << int(NotADatabase) << 0 << true << here
                 << warnings({ "DbManager::DbManager()", "Failed to query user version",
@@ -91,9 +90,6 @@ private slots:
         if (schema == NotADatabase) {
             QDir().mkpath(QFileInfo(blocker).absolutePath());
             QVERIFY(blocker.open(QIODevice::WriteOnly) && blocker.write(QByteArray(4096, 'x')) && blocker.flush());
-        } else if (schema == Foreign) {
-            old.reset(new TestDatabase);
-            old->exec({ "PRAGMA journal_mode = WAL;", "CREATE TABLE notes ( text TEXT);" });
         } else if (schema != NoFile) {
             // A current index taken back to `schema` (7 lacks themelet.partnerSpace, 8 and 9 themelet.version,
             // 10 and 11 file.category); three files in a plain directory and two in a package, all read.

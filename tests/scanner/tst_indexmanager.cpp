@@ -59,7 +59,6 @@ private slots:
             { "a.ogg|A|x|0", "c.ogg|B|x|0" });
         add("changed and unnamed", { ab, R"({"files": [{"fileName": "b.ogg", "displayName": "B2", "category": "y"}]})" },
             { "b.ogg|B2|y|0" });
-        add("empty files", { ab, R"({"files": []})" }, {});
         // A bad index leaves the rows of its directory as they are.
         add("root array", { ab, R"([{"fileName": "b.ogg"}])" }, { "a.ogg|A|x|0", "b.ogg|B|x|0" },
             { "Error parsing index from file \"%1\" , offset: 0 , errorString: \"no error occurred\"" });
