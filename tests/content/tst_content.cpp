@@ -86,7 +86,6 @@ private slots:
         QTest::newRow("5") << 5 << QVariant("Dawn") << QVariant("Dawn");
         QTest::newRow("9 no colour") << 9 << QVariant("dusky") << QVariant(QColor());
         QTest::newRow("11 text") << 11 << QVariant("#80ff0000") << QVariant(QColor("#80ff0000"));
-        QTest::newRow("14 off") << 14 << QVariant(false) << QVariant(false);
         QTest::newRow("15 on") << 15 << QVariant("true") << QVariant(true);
         for (int role : { -1, 4, 7, 8, 22, 23, 24 })
             QTest::addRow("%d", role) << role << QVariant("x") << QVariant();

@@ -12,12 +12,8 @@
 
 #include <memory>
 #include <numeric>
-#include <thread>
-#include <unistd.h>
 
 namespace {
-
-const char *const s_childVariable = "TST_QUERYAGENTS_READONLY_CHILD";
 
 // Keeps the batches and role 5 of each item, the display name in every role table.
 struct Batches : QueryAgent::Recipient
@@ -46,17 +42,6 @@ QVariantMap resource(const QString &path)
 {
     const QFileInfo file(path);
     return { { "url", QUrl::fromLocalFile(path) }, { "fileName", file.fileName() }, { "displayName", file.completeBaseName() } };
-}
-
-// As an unprivileged user, on an index it can't write beside: the file agent's rows, and whether "-shm" appeared.
-int readOnlyChild()
-{
-    QueryAgent *agent = QueryAgent::agentFor(ThemeletContent::File);
-    Batches batches;
-    if (!agent || !agent->query(&batches, FileQueryAgent::FileParameters()))
-        return 2;
-    QTextStream(stdout) << batches.names.join(' ') << ";shm " << QFile::exists(QueryAgent::databaseUrl(0).toLocalFile() + "-shm") << '\n';
-    return 0;
 }
 
 }
@@ -93,6 +78,8 @@ private slots:
         QCOMPARE(QueryAgent::databaseUrl(1).toString(), "file://" + qEnvironmentVariable("XDG_DATA_HOME")
                  + "/system/privileged/Themeletd/themeletd.sqlite?mode=ro&immutable=1");
         QVERIFY(DbManager().isOpen());
+        QueryAgent *const agent = QueryAgent::agentFor(ThemeletContent::File);
+        QVERIFY(agent && agent == QueryAgent::agentFor(ThemeletContent::File)); // one per thread and type, made once
         m_db.reset(new TestDatabase);
         m_database.reset(new QueryAgentDatabase);
         m_database->setConnectOptions(QStringLiteral("QSQLITE_OPEN_URI"));
@@ -101,60 +88,6 @@ private slots:
     }
 
     void init() { m_db->exec({ "DELETE FROM directory", "DELETE FROM themelet" }); } // the triggers take the other rows along
-
-    void statementCache()
-    {
-        // An invalid statement gives the full report each time: it is never cached.
-        QueryActor actor(*m_database);
-        const QStringList report = MessageLog::warningRecords(
-                { "QSqlQuery QueryActor::prepareQuery(const QString&)", "Failed to prepare query",
-                  TestDatabase::errorText("1", "no such table: nosuchtable"), "\"SELECT * FROM nosuchtable;\"" });
-        MessageLog log(report + report);
-        for (int i = 0; i < 2; ++i)
-            QVERIFY(actor.prepareQuery(QStringLiteral("SELECT * FROM nosuchtable;")).lastQuery().isEmpty());
-        QCOMPARE(log.records(), report + report);
-    }
-
-    void agentFor()
-    {
-        // One agent per thread and type, made once.
-        QVERIFY(QueryAgent::agentFor(ThemeletContent::File) == QueryAgent::agentFor(ThemeletContent::File));
-
-        // With the directory gone, each call tries to open again and fails the same way.
-        const QString directory = QFileInfo(TestDatabase::indexPath()).absolutePath();
-        QVERIFY(QDir().rename(directory, directory + ".aside"));
-        const QStringList report = MessageLog::warningRecords(
-                { "Database not opened", TestDatabase::errorText("14", "unable to open database file", "Error opening database") });
-        MessageLog log(report + report);
-        QVector<QueryAgent *> agents;
-        std::thread([&agents] { agents << QueryAgent::agentFor(ThemeletContent::File) << QueryAgent::agentFor(ThemeletContent::File); }).join();
-        QVERIFY(QDir().rename(directory + ".aside", directory));
-        QCOMPARE(log.records(), report + report);
-        QCOMPARE(agents, QVector<QueryAgent *>(2, nullptr));
-    }
-
-    void agentForReadOnlyFallback()
-    {
-        if (geteuid() != 0)
-            QSKIP("needs root to switch to an unprivileged user");
-        // A copy made while a writer held a row in the write-ahead log, in a directory the user can't write.
-        const QString sandbox = qEnvironmentVariable("THEMELET_SANDBOX");
-        const QString staging = sandbox + "/staging.sqlite";
-        const QString target = sandbox + "/rodata/system/privileged/Themeletd/themeletd.sqlite";
-        addFile("/d/main.ogg");
-        QVERIFY(m_db->exec(QStringLiteral("VACUUM INTO '%1'").arg(staging)));
-        TestDatabase writer(staging);
-        QVERIFY(writer.exec({ "PRAGMA journal_mode = WAL", "UPDATE file SET id = 2, displayName = 'wal'" }));
-        QVERIFY(QFileInfo(staging + "-wal").size() > 0 && QDir().mkpath(QFileInfo(target).absolutePath()));
-        for (const char *suffix : { "", "-wal" })
-            QVERIFY(QFile::copy(staging + suffix, target + suffix) && QFile::setPermissions(target + suffix, QFileDevice::Permissions(0x6444)));
-        QProcess child;
-        child.start("setpriv", { "--reuid=nobody", "--regid=nogroup", "--clear-groups", "--", "env", QString(s_childVariable) + "=1",
-                                 "XDG_DATA_HOME=" + sandbox + "/rodata", QCoreApplication::applicationFilePath() });
-        QVERIFY(child.waitForFinished(30000));
-        QVERIFY2(child.exitCode() == 0, child.readAllStandardError().constData());
-        QCOMPARE(child.readAllStandardOutput(), QByteArray("main;shm 0\n"));
-    }
 
     void fileList_data()
     {
@@ -236,16 +169,6 @@ private slots:
         for (const Content &missing : { files.queryByUrl(QUrl("http://example.com/other.ogg")), files.queryByUrl(QUrl::fromLocalFile("/d/x.ogg")),
                                         themelets.queryByUrl(url), themelets.queryByUrl(QUrl("http://example.com/t.ogg")) })
             QVERIFY(!missing.isValid());
-
-        // The thread's table name already taken: false, and no batch at all.
-        const QString table = "themelet_" + QString::number(m_database->threadId());
-        QVERIFY(QSqlQuery(*m_database).exec("CREATE TEMPORARY TABLE " + table + " (x)"));
-        MessageLog log(false);
-        Batches none;
-        QVERIFY(!themelets.query(&none, ThemeletQueryAgent::ThemeletParameters()) && none.sizes.isEmpty());
-        QCOMPARE(log.warnings().mid(0, 2), (QStringList { "virtual bool ThemeletQueryAgent::query(QueryAgent::Recipient*, "
-                                                          "const QueryAgent::Parameters&)", "Failed to create themelet table" }));
-        QVERIFY(QSqlQuery(*m_database).exec("DROP TABLE " + table));
     }
 
     void photos()
@@ -269,14 +192,6 @@ private slots:
                                                               "NULL|2014-05-02T00:00:00.000|64|48|6").arg(late).replace("NULL", QString()));
         QCOMPARE(roles(batches.all.last(), 12).section('|', 1),
                  QString("file:///p/more/m59.png|image/png|m59.png|/p/more/m59.png|m59|false||2015-01-01T00:00:59.000|0|3|0"));
-        QCOMPARE(batches.all.at(50).data()->data(2).toString(), QStringLiteral("image/jpeg"));
-
-        // The lookups name a table that was never there: each fails with its records, and gives nothing.
-        MessageLog log(false);
-        QVERIFY(!photos.queryById(late).isValid() && !photos.queryByUrl(QUrl::fromLocalFile("/p/late.jpg")).isValid()
-                && !photos.queryByUrl(QUrl("http://example.com/late.jpg")).isValid());
-        QCOMPARE(log.warnings().filter("no such table: photo").size(), 3);
-        QCOMPARE(log.warnings().filter("Content PhotoQueryAgent::querySinglePhoto(QSqlQuery&)").size(), 3);
     }
 
     void batches_data()
@@ -314,13 +229,5 @@ private slots:
     }
 };
 
-int main(int argc, char *argv[])
-{
-    QCoreApplication app(argc, argv);
-    if (qEnvironmentVariableIsSet(s_childVariable))
-        return readOnlyChild();
-    tst_QueryAgents test;
-    return QTest::qExec(&test, argc, argv);
-}
-
+QTEST_GUILESS_MAIN(tst_QueryAgents)
 #include "tst_queryagents.moc"
