@@ -40,6 +40,9 @@ private slots:
         QTest::newRow("corrupt") << "corrupt" << "-1|-1|NULL|NULL" << QStringList();
         QTest::newRow("fifo, not waited for") << "fifo" << "-1|-1|NULL|NULL" << QStringList();
         // A failed step leaves its rows stale for the next one.
+        QTest::newRow("failed reset") << "UPDATE ON file" << "1|1|old|1"
+                << failure("virtual bool ImageManager::updateMetaData()", "Failed to execute m_modifiedReset.",
+                           "UPDATE file SET metadataCurrent = 1 WHERE id = ?;");
         QTest::newRow("failed image write") << "INSERT ON image" << "1|1|old|1"
                 << failure("virtual bool ImageManager::updateMetaData()", "Failed to execute m_imageUpdate.",
                            "INSERT OR REPLACE INTO image ( fileId, dateTaken, width, height, orientation) VALUES (?, ?, ?, ?, ?);");
