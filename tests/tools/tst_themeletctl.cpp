@@ -40,7 +40,6 @@ class HostileService : public QObject, protected QDBusContext
     Q_CLASSINFO("D-Bus Interface", "com.vorka.themeletd")
 
 public slots:
-    QString setThemelet(const QString &) { return QStringLiteral("not an id"); }
     void refreshThemelets() { sendErrorReply("com.vorka.themeletd.Error.Failed", "first\nsecond\x1b[2J"); }
 };
 
@@ -145,34 +144,23 @@ private slots:
         QVERIFY2(!QFile::exists(TestDatabase::indexPath()), "a client never creates the index");
     }
 
-    void noBusOrBrokenIndex()
+    void noBus()
     {
         QProcessEnvironment environment = QProcessEnvironment::systemEnvironment();
         environment.insert("DBUS_SESSION_BUS_ADDRESS", "unix:path=" + sandbox() + "/no-bus");
         const QPair<int, QString> refresh = ctl({ "refresh" }, environment);
         QCOMPARE(refresh.first, 1);
         QVERIFY2(QRegularExpression("^stderr: themeletctl: no D-Bus session bus: [^\n]+\n$").match(refresh.second).hasMatch(), qPrintable(refresh.second));
-
-        QVERIFY(write(TestDatabase::indexPath(), "not a database"));
-        QCOMPARE(ctl({ "list", "themelets" }), qMakePair(1, "stderr: themeletctl: cannot open the index at " + TestDatabase::indexPath() + '\n'));
-        QVERIFY(QFile::remove(TestDatabase::indexPath()));
     }
 
-    void hostileService_data()
-    {
-        columns();
-        row({ "set", "/x.themelet" }, 1, "^stderr: themeletctl: Unexpected reply signature: got \"s\", expected \"x\"\n$");
-        row({ "refresh" }, 1, "^stderr: themeletctl: first second \\[2J\n$");
-    }
-
+    // A service's error text reaches the terminal as one line, without control characters.
     void hostileService()
     {
         QDBusConnection bus = QDBusConnection::sessionBus();
         HostileService service;
         QVERIFY(bus.registerObject(Service::Path, &service, QDBusConnection::ExportAllSlots) && bus.registerService(Service::Name));
-        verifyRow();
+        QCOMPARE(ctl({ "refresh" }), qMakePair(1, QString("stderr: themeletctl: first second [2J\n")));
         bus.unregisterService(Service::Name);
-        bus.unregisterObject(Service::Path);
     }
 
     void startService()
@@ -205,12 +193,9 @@ private slots:
 
         row({ "create", H + "/photo1.jpg" }, 0, "^Created themelet \\d+: photo1 \\(" + created + "\\)\nstderr: $");
         row({ "set", sunset }, 0, "^Active themelet " + m_id + ": Sunset \\(" + sunset + "\\)\nstderr: $");
-        row({ "status", "--json" }, 0, "\"activeThemelet\": \"file://" + sunset + "\"");
         row({ "set", "--json", m_id }, 0, "\"active\": true,.*\"contentId\": " + m_id + ",.*\"type\": \"themelet\"");
         row({ "favorite", m_id, "on" }, 0, none);
-        row({ "show", "--json", sunset }, 0, "\"favorite\": true");
         row({ "favorite", P + "/images/sunset.jpg", "off" }, 0, none);
-        row({ "show", "--json", sunset }, 0, "\"favorite\": false");
         row({ "favorite", H + "/photo3.jpg", "off" }, 1, "^stderr: themeletctl: no themelet has the wallpaper " + H + "/photo3.jpg\n$");
         row({ "index", S + "/elsewhere/new.jpg" }, 0, none);
         row({ "show", "--json", S + "/elsewhere/new.jpg" }, 0, R"("type": "photo",.*"width": 64)");
