@@ -135,7 +135,6 @@ private slots:
                                     << "Failed|" << 0 << unset;
         QTest::newRow("volume out of range") << "saveAttributes" << QVariantList { 1, m_sunsetId, map({ { "ringerVolume", 1000 } }) }
                                              << invalid << 1 << unset;
-        QTest::newRow("web url") << "setThemelet" << QVariantList { "https://example.com/a.themelet" } << invalid << -1 << unset;
         QTest::newRow("watched directory as package") << "installPackage" << QVariantList { m_watched } << invalid << -1 << unset;
         QTest::newRow("nothing installable") << "installPackage" << QVariantList { m_sandbox + "/loose" } << invalid + "Nothing to install"
                                              << -1 << unset;
@@ -222,7 +221,6 @@ private slots:
 
         // Removing a themelet made here takes its copy of the picture along.
         QCOMPARE(Service::call("remove", { 1, second.value() }).type(), QDBusMessage::ReplyMessage);
-        QCOMPARE(query(QStringLiteral("SELECT count(*) FROM themelet WHERE fileId = %1").arg(second.value())), QString("0"));
         QVERIFY(!QFile::exists(wallpapers + "Blue Lagoon-2.png") && QFile::exists(wallpapers + "Blue Lagoon.png"));
 
         // Removing the active one leaves no key naming its deleted picture, and the profile from before.
@@ -267,8 +265,11 @@ private slots:
                 attack(method, { url });
             attack("setFavorite", { url, true });
         }
-        // A map with integer keys, which the demarshalling must flatten or refuse.
-        QDBusArgument intKeys;
+        // Containers that the demarshalling must flatten or refuse: a structure, a map with integer keys.
+        QDBusArgument structure, intKeys;
+        structure.beginStructure();
+        structure << 1 << QString("s") << QDBusVariant(QVariantList { 2.5, "x" });
+        structure.endStructure();
         intKeys.beginMap(QVariant::Int, qMetaTypeId<QDBusVariant>());
         intKeys.beginMapEntry();
         intKeys << 7 << QDBusVariant(QVariantMap { { "url", tone } });
@@ -281,7 +282,8 @@ private slots:
         const QList<QVariantMap> maps { {}, { { "displayName", 5 } }, { { "ringerVolume", 1e300 } }, { { "homeWallpaper", keep } },
             nested(1, QVariantMap { { "ringerToneFile", QVariantMap { { "url", tone } } } }), { { "resources", 5 } },
             { { "unknownKey", QVariantList { 1, "two", QVariantMap { { "three", 3.0 } } } } }, { { "bytes", QByteArray(70000, '\0') } },
-            nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }), { { "resources", QVariant::fromValue(intKeys) } }, huge };
+            nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }), { { "resources", QVariant::fromValue(intKeys) } },
+            { { "resources", QVariant::fromValue(structure) } }, huge };
         for (int type : { -1, 0, 1, 3, 99, INT_MIN }) {
             for (qlonglong id : { -1LL, m_sunsetId, file, LLONG_MAX }) {
                 attack("remove", { type, id });
@@ -296,26 +298,22 @@ private slots:
         QCOMPARE(snapshot(), before);
     }
 
-    // A second instance leaves the index alone; a usage error is status 2, one line and a hint, as in themeletctl.
+    // A second instance leaves the index alone.
     void secondInstance()
     {
         const QDateTime modified = QFileInfo(TestDatabase::indexPath()).lastModified();
-        const QByteArray owned = "themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n";
-        for (const auto &run : { qMakePair(QStringList { "--no-default-watch" }, 1), qMakePair(QStringList { "-v", "--frob" }, 2) }) {
-            QProcess second;
-            second.start(THEMELETD_BINARY, run.first);
-            QVERIFY(second.waitForFinished(20000));
-            QCOMPARE(second.exitCode(), run.second);
-            QCOMPARE(second.readAllStandardError(), run.second == 1 ? owned
-                                                                     : "themeletd: Unknown option 'frob'.\nthemeletd: try 'themeletd --help'\n");
-        }
+        QProcess second;
+        second.start(THEMELETD_BINARY, { "--no-default-watch" });
+        QVERIFY(second.waitForFinished(20000));
+        QCOMPARE(second.exitCode(), 1);
+        QCOMPARE(second.readAllStandardError(), "themeletd: the name com.vorka.themeletd is already owned on the session bus; is themeletd running?\n");
         QCOMPARE(QFileInfo(TestDatabase::indexPath()).lastModified(), modified);
     }
 
     void stopAndRestart()
     {
         QCOMPARE(Service::call("setThemelet", { "file://" + m_package + "/sunset.themelet" }).type(), QDBusMessage::ReplyMessage);
-        const QString volume = "/org/orbaline/themelet/profiles/themelet/ringing.alert.volume", colour = "/desktop/vorka/themelet/primary_color";
+        const QString volume = "/org/orbaline/themelet/profiles/themelet/ringing.alert.volume";
         QTRY_COMPARE(DConfTest::read(volume), query("SELECT ringerVolume FROM themelet WHERE fileId = " + QString::number(m_sunsetId)));
         m_db.reset();
         m_service.terminate();
@@ -328,11 +326,9 @@ private slots:
         QCOMPARE(query("PRAGMA integrity_check"), QString("ok"));
         const QString applied = DConfTest::read(volume);
         DConfTest::write(volume, "99");
-        DConfTest::write(colour, "'#ff123456'");
         QVERIFY(Service::start(m_service, { m_watched, Sysroot::path("/usr/share") }));
         // The device follows the active themelet again.
         QTRY_COMPARE_WITH_TIMEOUT(DConfTest::read(volume), applied, 20000);
-        QTRY_COMPARE(DConfTest::read(colour), QString());
     }
 };
 
