@@ -133,9 +133,10 @@ private slots:
         QDBusConnection bus = QDBusConnection::sessionBus();
         Impostor service;
         QVERIFY(bus.registerObject(Service::Path, &service, QDBusConnection::ExportAllSlots) && bus.registerService(Service::Name));
-        QCOMPARE(ctl({ "refresh" }), qMakePair(1, QStringLiteral("stderr: themeletctl: first second [2J\n")));
+        const QPair<int, QString> result = ctl({ "refresh" });
         bus.unregisterService(Service::Name);
         bus.unregisterObject(Service::Path);
+        QCOMPARE(result, qMakePair(1, QStringLiteral("stderr: themeletctl: first second [2J\n")));
     }
 
     void startService()
