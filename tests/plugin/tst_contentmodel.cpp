@@ -1,12 +1,13 @@
 // SPDX-FileCopyrightText: 2026 The themelet authors
 // SPDX-License-Identifier: LGPL-2.1-or-later
 
-// The module's C++ side: the lists, and the calls that the lists and Themelet make to themeletd.
+// The module's C++ side: the lists and their difference, and the calls that the lists and Themelet make to themeletd.
 #include "contentmodel.h"
 #include "dbmanager.h"
 #include "declarativethemelet.h"
 #include "filequeryagent.h"
 #include "messagelog.h"
+#include "recordinglist.h"
 #include "recordingservice.h"
 #include "testdatabase.h"
 #include "themeletinterface.h"
@@ -66,6 +67,11 @@ QStringList displayNames(const QAbstractItemModel &model)
     for (int row = 0; row < model.rowCount(); ++row)
         names << model.index(row, 0).data(FileData::DisplayNameRole).toString();
     return names;
+}
+
+Content make(qint64 id, int type)
+{
+    return type == ThemeletContent::Themelet ? Content(new ThemeletData(id, QUrl())) : Content(new FileData(id, QUrl()));
 }
 
 bool finished(const AbstractContentModel &model)
@@ -152,6 +158,57 @@ private slots:
         QCOMPARE(log, QStringList { "remove 0 119" });
         QCOMPARE(status.count(), 4);
         QCOMPARE(model.status(), AbstractContentModel::Finished);
+    }
+
+    // Random pairs of lists (same ids across types, ids too large for a key, reversals, long distances,
+    // small edits) in random batches, with and without keys, as a model keeps them between queries:
+    // the edits must give exactly the new list and its handles.
+    void listDifference()
+    {
+        for (int seed = 1; seed <= 2000; ++seed) {
+            QRandomGenerator random(seed);
+            const int ids = 1 + random.bounded(40);
+            const auto randomList = [&]() {
+                QVector<Content> list(random.bounded(31));
+                for (Content &content : list)
+                    content = make(qint64(random.bounded(ids)) << (random.bounded(8) ? 0 : 57), random.bounded(2));
+                return list;
+            };
+            const QVector<Content> before = randomList();
+            QVector<Content> after = seed % 4 == 0 ? randomList() : before;
+            if (seed % 4 == 1)
+                std::reverse(after.begin(), after.end());
+            if (seed % 4 == 2) // long distances: the back half moves to the front
+                std::rotate(after.begin(), after.begin() + after.size() / 2, after.end());
+            for (int i = seed % 4 == 3 ? random.bounded(5) : 0; i > 0; --i) {
+                if (!after.isEmpty() && random.bounded(2))
+                    after.remove(random.bounded(after.size()));
+                else
+                    after.insert(random.bounded(after.size() + 1), make(random.bounded(ids), 0));
+            }
+            for (Content &content : after) // fresh handles: a row left unrefreshed shows
+                content = Content(content.data()->clone());
+
+            const auto keysOf = [keyed = seed % 2 == 1](const QVector<Content> &rows) {
+                QVector<SynchronizedContent::Key> keys;
+                for (int i = 0; keyed && i < rows.size(); ++i)
+                    keys << SynchronizedContent::key(rows.at(i));
+                return keys;
+            };
+            RecordingList agent;
+            QVector<SynchronizedContent::Key> keys = keysOf(before);
+            agent.list.finish(before, &agent, &keys);
+            QVector<Content> received;
+            while (received.size() < after.size()) {
+                received += after.mid(received.size(), 1 + random.bounded(8));
+                agent.list.merge(received, &agent, keysOf(received));
+            }
+            keys = keysOf(after);
+            agent.list.finish(received, &agent, &keys);
+            QVERIFY2(agent.valid && agent.list.size() == after.size(), qPrintable(QString("seed %1: %2").arg(seed).arg(agent.operations.join(", "))));
+            for (int i = 0; i < after.size(); ++i)
+                QVERIFY2(agent.list.at(i).data() == after.at(i).data(), qPrintable(QStringLiteral("seed %1 row %2").arg(seed).arg(i)));
+        }
     }
 
     void deletedDuringQuery()
