@@ -46,13 +46,11 @@ TestCase {
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
         compare([info.displayName, info.highlightColor, info.notARole], ["Aurora", "#ffcc66", "kept"])
-        compare(info.resources.ringerToneFile.fileName, "dusk.ogg")
-        compare(String(info.resources.ringerToneFile.url), nature + "sounds/dusk.ogg")
+        compare([info.resources.ringerToneFile.fileName, String(info.resources.ringerToneFile.url)], ["dusk.ogg", nature + "sounds/dusk.ogg"])
 
         // Not indexed: nothing loads, and no changed().
         info.url = nature + "none.themelet"
-        compare(info.contentId, 0)
-        compare(changedSpy.count, 1)
+        compare([info.contentId, changedSpy.count], [0, 1])
         typeSpy.target = info
         info.contentType = ContentInfo.Photo
         info.contentType = ContentInfo.Photo

@@ -45,14 +45,11 @@ TestCase {
         var filtered = finished(photos, { nameFilter: "ab" })
         var model = finished(photos)
         compare(column(filtered, "fileName"), "ab.jpg,abc.jpg")
-        var filterSignals = 0
-        model.nameFilterChanged.connect(function() { ++filterSignals })
         var steps = [["a", "ab.jpg,a.jpg,abc.jpg"], ["ab", "ab.jpg,abc.jpg"], ["", "b.jpg,ab.jpg,a.jpg,abc.jpg"]]
         for (var i = 0; i < steps.length; ++i) {
             model.nameFilter = steps[i][0]
             compare([model.status, column(model, "fileName")], [PhotoModel.Finished, steps[i][1]], steps[i][0])
         }
-        compare(filterSignals, 0) // declared, never emitted
     }
 
     // Ringtones, then the tones of customers, then the defaults, then the rest: the themelet's
@@ -63,11 +60,8 @@ TestCase {
     }
 
     function test_contentChanged_data() {
-        return [
-            { tag: "file", type: 0, queried: [1, 0, 1] },
-            { tag: "themelet", type: 1, queried: [1, 0, 0] },
-            { tag: "photo", type: 2, queried: [0, 1, 0] }
-        ]
+        return [{ tag: "file", type: 0, queried: [1, 0, 1] }, { tag: "themelet", type: 1, queried: [1, 0, 0] },
+                { tag: "photo", type: 2, queried: [0, 1, 0] }]
     }
 
     // Each model queries again only for its types; a query ends with one statusChanged.
