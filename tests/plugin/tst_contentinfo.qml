@@ -40,14 +40,13 @@ TestCase {
         return createTemporaryObject(themeletInfo, test, { url: nature + name + ".themelet" })
     }
 
-    function test_loadByUrl() {
+    function test_loadSaveRemove() {
         var info = createTemporaryObject(themeletInfo, test)
         changedSpy.target = info
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
         compare([info.displayName, info.highlightColor, info.notARole], ["Aurora", "#ffcc66", "kept"])
         compare([info.resources.ringerToneFile.fileName, String(info.resources.ringerToneFile.url)], ["dusk.ogg", nature + "sounds/dusk.ogg"])
-
         // Not indexed: nothing loads, and no changed().
         info.url = nature + "none.themelet"
         compare([info.contentId, changedSpy.count], [0, 1])
@@ -55,12 +54,10 @@ TestCase {
         info.contentType = ContentInfo.Photo
         info.contentType = ContentInfo.Photo
         compare(typeSpy.count, 1)
-    }
 
-    // A load writes every bound property; none of that is a change to save. Of a nested
-    // group only the changed leaf goes; the local values stay until the next load.
-    function test_saveAndRemove() {
-        var info = loaded("ocean")
+        // A load writes every bound property; none of that is a change to save. Of a nested
+        // group only the changed leaf goes; the local values stay until the next load.
+        info = loaded("ocean")
         info.contentId = loaded("aurora").contentId
         compare(info.url, nature + "aurora.themelet")
         info.save()

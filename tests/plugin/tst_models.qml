@@ -55,8 +55,7 @@ TestCase {
     // Ringtones, then the tones of customers, then the defaults, then the rest: the themelet's
     // tone, which has no category; the order within the rest is the index tests'.
     function test_tones() {
-        var model = finished(tones)
-        compare(column(model, "fileName"), "ring.ogg,custom.ogg,alarm.ogg,dusk.ogg")
+        compare(column(finished(tones), "fileName"), "ring.ogg,custom.ogg,alarm.ogg,dusk.ogg")
     }
 
     function test_contentChanged_data() {
