@@ -27,9 +27,6 @@ class tst_Module : public QObject
         return object;
     }
 
-    // Qt's default session bus connection: opened by the first D-Bus use in the process.
-    static bool sessionBusOpen() { return QDBusConnection(QStringLiteral("qt_default_session_bus")).isConnected(); }
-
 private slots:
     void import()
     {
@@ -40,8 +37,9 @@ private slots:
         now.setLoadHints(QLibrary::ResolveAllSymbolsHint);
         QVERIFY2(now.load(), qPrintable(now.errorString()));
 
-        // Importing registers types and nothing else: no proxy, no D-Bus traffic. Profile
-        // doesn't use the bus of Qt either; the first list model does.
+        // Importing registers types and nothing else: no proxy, no D-Bus traffic (Qt's default session bus
+        // connection opens with the first use). Profile doesn't use the bus of Qt either; the first list model does.
+        const auto sessionBusOpen = []() { return QDBusConnection(QStringLiteral("qt_default_session_bus")).isConnected(); };
         QVERIFY(create("Profile {}"));
         QVERIFY(!sessionBusOpen());
         // Without index and service, the list ends in Error rather than waiting.
