@@ -10,7 +10,6 @@
 #include <QDBusMessage>
 #include <QDBusMetaType>
 #include <QTest>
-#include <QVariantList>
 
 #include <utility>
 

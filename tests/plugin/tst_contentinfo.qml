@@ -18,7 +18,6 @@ TestCase {
             contentType: ContentInfo.Themelet
             property string displayName
             property color highlightColor
-            property string notARole: "kept"
             // A map-valued role, two levels deep.
             readonly property QtObject resources: QtObject {
                 readonly property QtObject ringerToneFile: QtObject {
@@ -45,7 +44,7 @@ TestCase {
         changedSpy.target = info
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
-        compare([info.displayName, info.highlightColor, info.notARole], ["Aurora", "#ffcc66", "kept"])
+        compare([info.displayName, info.highlightColor], ["Aurora", "#ffcc66"])
         compare([info.resources.ringerToneFile.fileName, String(info.resources.ringerToneFile.url)], ["dusk.ogg", nature + "sounds/dusk.ogg"])
         // Not indexed: nothing loads, and no changed().
         info.url = nature + "none.themelet"
