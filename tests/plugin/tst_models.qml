@@ -25,10 +25,7 @@ TestCase {
     }
 
     function column(model, role) {
-        var values = []
-        for (var i = 0; i < model.count; ++i)
-            values.push(String(model.get(i)[role]))
-        return values.join()
+        return Array.from({ length: model.count }, function(unused, i) { return String(model.get(i)[role]) }).join()
     }
 
     // Favourites first; the filter works in a query.

@@ -9,8 +9,6 @@
 #include <QQmlEngine>
 #include <QtTest>
 
-#include <memory>
-
 class tst_Module : public QObject
 {
     Q_OBJECT
