@@ -42,7 +42,7 @@ bool writeContent(const QString &pictures)
     int day = 0;
     QDir().mkpath(pictures);
     for (const char *name : { "b.jpg", "ab.jpg", "a.jpg", "abc.jpg" }) {
-        if (!writeJpeg(pictures + QLatin1Char('/') + name, { QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(++day) }))
+        if (!writeJpeg(pictures + '/' + name, { QString("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(++day) }))
             return false;
     }
     return true;

@@ -45,7 +45,8 @@ TestCase {
         info.url = nature + "aurora.themelet"
         compare(changedSpy.count, 1)
         compare([info.displayName, info.highlightColor], ["Aurora", "#ffcc66"])
-        compare([info.resources.ringerToneFile.fileName, String(info.resources.ringerToneFile.url)], ["dusk.ogg", nature + "sounds/dusk.ogg"])
+        var tone = info.resources.ringerToneFile
+        compare([tone.fileName, String(tone.url)], ["dusk.ogg", nature + "sounds/dusk.ogg"])
         // Not indexed: nothing loads, and no changed().
         info.url = nature + "none.themelet"
         compare([info.contentId, changedSpy.count], [0, 1])

@@ -30,8 +30,7 @@ private slots:
     {
         // Before the engine loads it lazily: a load that binds every symbol at once, as
         // LD_BIND_NOW or a -z now link would, in a process that isn't the service.
-        const QString moduleDir = qEnvironmentVariable("QML2_IMPORT_PATH") + QStringLiteral("/Orbaline/Themelet");
-        QLibrary now(moduleDir + QStringLiteral("/libthemelet.so"));
+        QLibrary now(qEnvironmentVariable("QML2_IMPORT_PATH") + QStringLiteral("/Orbaline/Themelet/libthemelet.so"));
         now.setLoadHints(QLibrary::ResolveAllSymbolsHint);
         QVERIFY2(now.load(), qPrintable(now.errorString()));
 
