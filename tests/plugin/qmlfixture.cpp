@@ -12,16 +12,6 @@ using namespace Fixture;
 
 namespace {
 
-QString pictures()
-{
-    return qEnvironmentVariable("THEMELET_SANDBOX") + QStringLiteral("/pictures");
-}
-
-bool writePhoto(const QString &name, int day)
-{
-    return writeJpeg(pictures() + QLatin1Char('/') + name, { QStringLiteral("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(day) });
-}
-
 QByteArray themelet(const QString &name, int day, const QString &tone = QString())
 {
     return QStringLiteral(R"({"wallpaper": "%1.jpg", "displayName": "%2", "timestamp": "2014-05-0%3T12:00:00",)"
@@ -31,7 +21,7 @@ QByteArray themelet(const QString &name, int day, const QString &tone = QString(
             .toUtf8();
 }
 
-bool writeContent()
+bool writeContent(const QString &pictures)
 {
     // Favourites come first, each group by time; Ocean, the earlier, is made a non-favourite below.
     const QString package = Sysroot::path(QStringLiteral("/usr/share/themelet/nature"));
@@ -48,8 +38,14 @@ bool writeContent()
     if (!writeTree(tones, { "alarm.ogg", "custom.ogg", "ring.ogg" }, "x") || !write(tones + ".index", index))
         return false;
 
-    return QDir().mkpath(pictures()) && writePhoto("b.jpg", 1) && writePhoto("ab.jpg", 2) && writePhoto("a.jpg", 3)
-            && writePhoto("abc.jpg", 4);
+    // Photos by the time taken, which their names don't follow.
+    int day = 0;
+    QDir().mkpath(pictures);
+    for (const char *name : { "b.jpg", "ab.jpg", "a.jpg", "abc.jpg" }) {
+        if (!writeJpeg(pictures + '/' + name, { QString("set Exif.Photo.DateTimeOriginal 2014:05:0%1 12:00:00").arg(++day) }))
+            return false;
+    }
+    return true;
 }
 
 }
@@ -59,11 +55,12 @@ int main(int argc, char **argv)
     QGuiApplication app(argc, argv);
     DbManager::instance();
     FileManager *files = FileManager::instance();
-    if (!files || !writeContent())
+    const QString pictures = qEnvironmentVariable("THEMELET_SANDBOX") + QStringLiteral("/pictures");
+    if (!files || !writeContent(pictures))
         return 1;
     for (const QString &path : InstallManager::installPaths())
         installer()->appendDirectory(path);
-    files->appendDirectory(pictures(), FileManager::UserScope, FileManager::ScanAlways);
+    files->appendDirectory(pictures, FileManager::UserScope, FileManager::ScanAlways);
     if (!waitIdle())
         return 1;
     TestDatabase db;

@@ -8,9 +8,7 @@
 #include <QDBusConnection>
 #include <QDBusContext>
 #include <QDBusMessage>
-#include <QDBusMetaType>
 #include <QTest>
-#include <QVariantList>
 
 #include <utility>
 
@@ -74,7 +72,7 @@ public:
     QString errorMessage; // answers every call with an error when set
 
 public slots:
-    // The calls the module makes; the CLI's tests cover the others against the real service.
+    // The calls that the module makes.
     qlonglong createThemelet(const QString &url) { return record({ "createThemelet", url }); }
     void remove(int contentType, qlonglong contentId) { record({ "remove", contentType, contentId }); }
     void saveAttributes(int contentType, qlonglong contentId, const QVariantMap &args)

@@ -15,22 +15,16 @@ TestCase {
     Component { id: profileComponent; Profile {} }
     SignalSpy { id: activeSpy; signalName: "activeProfileChanged" }
 
-    function init() {
-        Fixture.dconf(["reset", "-f", "/org/orbaline/themelet/"])
-    }
-
     // Reads and notices of values that another process writes are tst_profilemanager's.
     function test_writesThrough() {
-        var profile = createTemporaryObject(profileComponent, test, { profile: Profile.Silent })
-        profile.ringerToneFile = "/sounds/new.ogg"
-        profile.ringerVolume = 20
+        var silent = createTemporaryObject(profileComponent, test, { profile: Profile.Silent })
+        silent.ringerToneFile = "/sounds/new.ogg"
+        silent.ringerVolume = 20
         tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "'/sounds/new.ogg'" })
         compare(Fixture.dconf(["read", profiles + "silent/ringing.alert.volume"]), "20")
-        profile.clearTone(Profile.RingerTone)
+        silent.clearTone(Profile.RingerTone)
         tryVerify(function() { return Fixture.dconf(["read", profiles + "silent/ringing.alert.tone"]) === "" })
-    }
 
-    function test_activeProfile() {
         var profile = createTemporaryObject(profileComponent, test, { profile: Profile.Themelet, activateProfileOnChange: true })
         activeSpy.target = profile
         compare(Fixture.dconf(["read", "/org/orbaline/themelet/profile"]), "'themelet'")

@@ -4,7 +4,6 @@
 #include "recordingservice.h"
 
 #include <QProcess>
-#include <QQmlExtensionPlugin>
 #include <QtQml>
 
 // What a QML test needs from outside its engine: the sandbox's path, the dconf tool as
