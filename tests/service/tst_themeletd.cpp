@@ -283,7 +283,7 @@ private slots:
             nested(1, QVariantMap { { "ringerToneFile", QVariantMap { { "url", tone } } } }), { { "resources", 5 } },
             { { "unknownKey", QVariantList { 1, "two", QVariantMap { { "three", 3.0 } } } } }, { { "bytes", QByteArray(70000, '\0') } },
             nested(21, "deep"), nested(20, QVariantMap { { "url", tone } }), { { "resources", QVariant::fromValue(intKeys) } },
-            { { "resources", QVariant::fromValue(structure) } }, huge };
+            { { "resources", QVariant::fromValue(structure) } } };
         for (int type : { -1, 0, 1, 3, 99, INT_MIN }) {
             for (qlonglong id : { -1LL, m_sunsetId, file, LLONG_MAX }) {
                 attack("remove", { type, id });
@@ -291,6 +291,7 @@ private slots:
                     attack("saveAttributes", { type, id, map });
             }
         }
+        attack("saveAttributes", { 1, m_sunsetId, huge }); // once: it is slow to marshal
 
         Service::call("saveAttributes", { 1, m_sunsetId, map({ { "displayName", "Still here" } }) });
         QTRY_COMPARE(query("SELECT displayName FROM file WHERE id = " + QString::number(m_sunsetId)), QString("Still here"));
