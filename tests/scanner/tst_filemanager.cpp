@@ -210,6 +210,9 @@ private slots:
         const qint64 file = manager.insertFile(other + "/t.txt");
         QVERIFY(file > 0);
         QCOMPARE(manager.insertFile(other + "/t.txt"), file);
+        // An inserted file's time is stored as the scan stores it: UTC text, whatever the zone.
+        QCOMPARE(m_sql.value("SELECT modificationTime FROM file WHERE id = " + QString::number(file)).toString(),
+                 QFileInfo(other + "/t.txt").lastModified().toUTC().toString(Qt::ISODateWithMs));
         QCOMPARE(m_sql.rows("SELECT parentId, scope, mimeType, permissions FROM directory JOIN file ON directoryId = directory.id"
                             " WHERE path = '" + other + "';"), QStringList { "NULL|1|text/plain|3" });
         QVERIFY(waitIdle());
