@@ -27,30 +27,35 @@ ChangeNotifier *ChangeNotifier::instance()
 
 void ChangeNotifier::notify(int type)
 {
-    const auto open = m_timerOfType.constFind(type);
-    if (open != m_timerOfType.constEnd()) {
-        m_windows[*open].pending = true;
+    Window &window = m_windows[type];
+    if (window.timerId)
+        return;
+    const qint64 age = window.sent.isValid() ? window.sent.elapsed() : m_interval;
+    if (age >= m_interval) {
+        send(type, window);
         return;
     }
-    emit contentChanged(type);
-    const int timerId = startTimer(m_interval, Qt::PreciseTimer);
-    m_timerOfType.insert(type, timerId);
-    m_windows.insert(timerId, { type, false });
+    window.timerId = startTimer(int(m_interval - age), Qt::PreciseTimer);
+    m_typeOfTimer.insert(window.timerId, type);
 }
 
 void ChangeNotifier::timerEvent(QTimerEvent *event)
 {
-    const auto window = m_windows.find(event->timerId());
-    if (window == m_windows.end())
+    const auto due = m_typeOfTimer.find(event->timerId());
+    if (due == m_typeOfTimer.end())
         return QObject::timerEvent(event);
-    const int type = window->type;
-    const bool pending = window->pending;
+    const int type = *due;
+    m_typeOfTimer.erase(due);
     killTimer(event->timerId());
-    m_timerOfType.remove(type);
-    m_windows.erase(window);
-    if (pending) {
-        // A fresh timer rather than a repeating one: a late tick would let a
-        // repeating timer catch up and send two signals less than an interval apart.
-        notify(type);
-    }
+    Window &window = m_windows[type];
+    window.timerId = 0;
+    send(type, window);
+}
+
+void ChangeNotifier::send(int type, Window &window)
+{
+    // Timed from the signal itself, so that a late turn of the loop can't
+    // bring the next one closer than the interval.
+    window.sent.start();
+    emit contentChanged(type);
 }

@@ -4,14 +4,15 @@
 #ifndef CHANGENOTIFIER_H
 #define CHANGENOTIFIER_H
 
+#include <QElapsedTimer>
 #include <QHash>
 #include <QObject>
 
-// Coalesces change notices per content type: the first notice of a quiet type
-// goes out at once and opens a window; notices inside the window are folded
-// into one that goes out when it closes, which opens the next window. So a
-// type sees at most one signal per interval, and the last notice of a burst
-// is never lost.
+// Coalesces change notices per content type: a notice goes out at once when
+// the type's last signal is at least an interval old; otherwise one signal is
+// due at the end of that interval, and later notices fold into it. So a type
+// sees at most one signal per interval, the last notice of a burst is never
+// lost, and a quiet notifier has no timer running.
 class ChangeNotifier : public QObject
 {
     Q_OBJECT
@@ -33,14 +34,13 @@ protected:
 private:
     struct Window
     {
-        int type;
-        bool pending;
+        QElapsedTimer sent; // since the type's last signal
+        int timerId = 0; // of the signal that is due, if one is
     };
-
+    void send(int type, Window &window);
     static ChangeNotifier *s_instance;
-
-    QHash<int, int> m_timerOfType;
-    QHash<int, Window> m_windows; // by timer id
+    QHash<int, Window> m_windows; // by type
+    QHash<int, int> m_typeOfTimer;
     int m_interval;
 };
 
