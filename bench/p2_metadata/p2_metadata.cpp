@@ -89,6 +89,9 @@ int main(int argc, char **argv)
     const double loop1 = bareLoop(paths, &cpu1);
 
     FileManager *files = FileManager::instance();
+    // The writing connection as themeletd sets it up.
+    QSqlQuery(DbManager::instance()).exec(QStringLiteral("PRAGMA cache_size = -512;"));
+    QSqlQuery(DbManager::instance()).exec(QStringLiteral("PRAGMA synchronous = NORMAL;"));
     const double start = Bench::now();
     files->appendDirectory(dir, FileManager::UserScope, FileManager::ScanNew);
     QTimer::singleShot(900 * 1000, &app, &QCoreApplication::quit); // a stuck loop still reports
