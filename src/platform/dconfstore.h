@@ -45,19 +45,22 @@ public:
 
     static bool isKey(const QString &path);
 
+private slots:
+    void notified(const QString &prefix, const QStringList &changes, const QString &tag);
+
 private:
     struct Watch {
         QObject *receiver;
         Handler handler;
     };
 
-    static void changed(DConfClient *client, const char *prefix, const char *const *changes,
-                        const char *tag, void *self);
+    void listen();
     void dispatch(const QString &changedPath);
     void post(const QString &watchedPath, const QString &changedPath);
 
     DConfClient *m_client = nullptr;
     QHash<QString, QList<Watch>> m_watches;
+    bool m_listening = false;
 };
 
 #endif
