@@ -169,13 +169,15 @@ bool QueryActor::execBatch(QSqlQuery &query, const QList<QVariantList> &columns,
     if (columns.isEmpty() || columns.first().isEmpty())
         return true;
     QList<QVariantList> bound = columns;
-    for (QVariantList &column : bound) {
+    for (int i = 0; i < columns.size(); ++i) {
+        const QVariantList &column = columns.at(i);
         const auto marked = std::find_if(column.cbegin(), column.cend(), [](const QVariant &value) {
-            return value.userType() == QMetaType::QString && value.toString().startsWith(QChar(0xFEFF));
+            return value.userType() == QMetaType::QString
+                    && static_cast<const QString *>(value.constData())->startsWith(QChar(0xFEFF));
         });
         if (marked == column.cend())
             continue;
-        for (QVariant &value : column) {
+        for (QVariant &value : bound[i]) {
             if (value.userType() == QMetaType::QString)
                 value = text(value.toString());
         }

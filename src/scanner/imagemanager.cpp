@@ -7,7 +7,10 @@
 #include "quillmetadata.h"
 #include "queryagentdatabase.h"
 
-#include <QFileInfo>
+#include "statementreader.h"
+
+#include <QFile>
+#include <qplatformdefs.h>
 #include <QImageReader>
 
 namespace {
@@ -67,14 +70,19 @@ bool ImageManager::updateMetaData()
     QVariantList widths;
     QVariantList heights;
     QVariantList orientations;
-    while (m_modifiedQuery.next()) {
-        const QString path = m_modifiedQuery.value(1).toString() + QLatin1Char('/')
-                + m_modifiedQuery.value(2).toString();
-        ids.append(m_modifiedQuery.value(0).toLongLong());
+    for (QVariantList *list : { &ids, &dates, &widths, &heights, &orientations })
+        list->reserve(BatchSize);
+    StatementReader rows(m_modifiedQuery, true);
+    while (rows.next()) {
+        // A batch mostly shares one directory.
+        const QString path = rows.repeatedText(1) + QLatin1Char('/') + rows.text(2);
+        ids.append(rows.id(0));
 
         // Header only: -1 x -1 for anything unreadable, which still counts as read.
         // Only regular files: opening a FIFO would block the whole loop.
-        const QSize size = QFileInfo(path).isFile() ? QImageReader(path, QByteArray()).size() : QSize(-1, -1);
+        QT_STATBUF status;
+        const bool regular = QT_STAT(QFile::encodeName(path).constData(), &status) == 0 && S_ISREG(status.st_mode);
+        const QSize size = regular ? QImageReader(path, QByteArray()).size() : QSize(-1, -1);
         widths.append(size.width());
         heights.append(size.height());
 
