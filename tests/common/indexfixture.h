@@ -111,10 +111,11 @@ inline bool installFrom(const QString &directory)
 }
 
 // The records of a failed statement, as patterns: function, message, error, statement.
-inline QStringList failure(const char *function, const char *message, const QString &statement)
+inline QStringList failure(const char *function, const char *message, const QString &statement,
+                           const QString &error = QString())
 {
     return { '^' + QRegularExpression::escape(function) + '$', '^' + QRegularExpression::escape(message) + '$',
-             QStringLiteral("^QSqlError\\("), "^\"" + QRegularExpression::escape(statement) };
+             "^QSqlError\\(.*" + QRegularExpression::escape(error), "^\"" + QRegularExpression::escape(statement) };
 }
 
 // The warnings match these patterns, in this order, and there are no others.

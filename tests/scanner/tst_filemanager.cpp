@@ -100,7 +100,8 @@ private slots:
                 "/ A/ A/C/ B/ +A/a|0 +A/C/c|0 +B/b|0 +r|0", 4 };
         // S is a root of its own: inserting it as a child fails, the parent's scan rolls back and the loop stops.
         QTest::newRow("a known root is not adopted") << Case { 0, "mkdir S; touch r", "S/=1", "", "/ S/", 0,
-                failure("bool FileManager::scanDirectory()", "Failed to execute m_directoryInsert.", "INSERT INTO directory") };
+                failure("bool FileManager::scanDirectory()", "Failed to execute m_directoryInsert.", "INSERT INTO directory",
+                        "UNIQUE constraint failed: directory.path") };
 
         QTest::newRow("move onto a known file") << Case { 0, "touch a b", "a b", "mv a b", "/ b|0", 2 };
         QTest::newRow("create, delete, create: rolled back") << Case { 0, "", "", "touch f; rm f; touch f", "/", 1,
