@@ -4,11 +4,11 @@
 #include "queryactor.h"
 
 #include "queryagentdatabase.h"
+#include "statementreader.h"
 
 #include <QDateTime>
 #include <QDebug>
 #include <QSqlError>
-#include <QSqlResult>
 
 #include <algorithm>
 
@@ -130,10 +130,7 @@ enum class Batch { Done, NotMine, Failed };
 // failure *row is the row that failed, and the rows before it have run.
 Batch stepRows(QSqlQuery &query, const QList<QVariantList> &columns, int *row)
 {
-    const QVariant handle = query.result() ? query.result()->handle() : QVariant();
-    if (!handle.isValid() || qstrcmp(handle.typeName(), "sqlite3_stmt*") != 0)
-        return Batch::NotMine;
-    sqlite3_stmt *statement = *static_cast<sqlite3_stmt *const *>(handle.constData());
+    sqlite3_stmt *statement = StatementReader::statementOf(query);
     if (!statement || sqlite3_bind_parameter_count(statement) != columns.size())
         return Batch::NotMine;
     const int rows = columns.first().size();

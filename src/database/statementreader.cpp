@@ -10,12 +10,19 @@
 StatementReader::StatementReader(QSqlQuery &query, bool direct)
     : m_query(query)
 {
-    if (!direct || !query.result())
-        return;
+    if (direct)
+        m_direct = statementOf(query);
+}
+
+sqlite3_stmt *StatementReader::statementOf(QSqlQuery &query)
+{
+    if (!query.result())
+        return nullptr;
     // Qt hands out the statement of its SQLite driver as an opaque pointer.
     const QVariant handle = query.result()->handle();
-    if (handle.isValid() && qstrcmp(handle.typeName(), "sqlite3_stmt*") == 0)
-        m_direct = *static_cast<sqlite3_stmt *const *>(handle.constData());
+    if (!handle.isValid() || qstrcmp(handle.typeName(), "sqlite3_stmt*") != 0)
+        return nullptr;
+    return *static_cast<sqlite3_stmt *const *>(handle.constData());
 }
 
 bool StatementReader::next()

@@ -23,6 +23,9 @@ class StatementReader
 public:
     explicit StatementReader(QSqlQuery &query, bool direct = false);
 
+    // The SQLite statement behind a prepared query; null for another driver.
+    static sqlite3_stmt *statementOf(QSqlQuery &query);
+
     // The next row; false at the end (or on an error, as QSqlQuery::next()).
     bool next();
 

@@ -36,20 +36,20 @@ void ChangeNotifier::notify(int type)
         return;
     }
     window.timerId = startTimer(int(m_interval - age), Qt::PreciseTimer);
-    m_typeOfTimer.insert(window.timerId, type);
 }
 
 void ChangeNotifier::timerEvent(QTimerEvent *event)
 {
-    const auto due = m_typeOfTimer.find(event->timerId());
-    if (due == m_typeOfTimer.end())
-        return QObject::timerEvent(event);
-    const int type = *due;
-    m_typeOfTimer.erase(due);
-    killTimer(event->timerId());
-    Window &window = m_windows[type];
-    window.timerId = 0;
-    send(type, window);
+    // A few content types: a walk over them finds the timer's.
+    for (auto window = m_windows.begin(); window != m_windows.end(); ++window) {
+        if (window->timerId == event->timerId()) {
+            killTimer(window->timerId);
+            window->timerId = 0;
+            send(window.key(), *window);
+            return;
+        }
+    }
+    QObject::timerEvent(event);
 }
 
 void ChangeNotifier::send(int type, Window &window)

@@ -40,7 +40,6 @@ private:
     void send(int type, Window &window);
     static ChangeNotifier *s_instance;
     QHash<int, Window> m_windows; // by type
-    QHash<int, int> m_typeOfTimer;
     int m_interval;
 };
 
